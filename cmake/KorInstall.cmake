@@ -10,7 +10,7 @@ endif()
 install(TARGETS ${KOR_INSTALLED_TARGETS} EXPORT korTargets)
 install(EXPORT korTargets NAMESPACE kor:: DESTINATION ${KOR_PACKAGE_DIR})
 install(DIRECTORY basic platform processes DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}/kor
-  FILES_MATCHING PATTERN "*.h" PATTERN "kernels" EXCLUDE)
+  FILES_MATCHING PATTERN "*.h" PATTERN "kernels" EXCLUDE PATTERN "engine" EXCLUDE)
 
 configure_package_config_file(${CMAKE_CURRENT_LIST_DIR}/korConfig.cmake.in
   ${CMAKE_CURRENT_BINARY_DIR}/korConfig.cmake INSTALL_DESTINATION ${KOR_PACKAGE_DIR})
