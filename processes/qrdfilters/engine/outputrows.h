@@ -35,67 +35,79 @@ public:
     void Write(const WindowStatistics& oStatistics)
     {
         TSample* pOut = moOut.GetPixelAs<TSample>(0, oStatistics.mnRow) + oStatistics.mnFirst;
+        const std::size_t nPadded = oStatistics.GetPadded();
         if constexpr (std::is_same_v<TSample, double>)
         {
-            // The padding is written over by the next stretch of the row.
-            const std::size_t nRow = std::size_t{moOut.mnWidth} * moOut.mnChannels;
-            if (!mbMasked && !mbStreamed && oStatistics.mnFirst + oStatistics.GetPadded() <= nRow)
+            if (CanFinishInPlace(oStatistics))
             {
-                moFinish(oStatistics, {pOut, oStatistics.GetPadded()});
+                moFinish(oStatistics, {pOut, nPadded});
                 return;
             }
         }
-        mvdfResults.resize(std::max(mvdfResults.size(), oStatistics.GetPadded()));
-        moFinish(oStatistics, {mvdfResults.data(), oStatistics.GetPadded()});
+        mvdfResults.resize(std::max(mvdfResults.size(), nPadded));
+        moFinish(oStatistics, {mvdfResults.data(), nPadded});
         const std::span<const double> vdfResults(mvdfResults.data(), oStatistics.mnSamples);
-        if (!mbMasked)
-        {
-            if constexpr (std::is_same_v<TSample, double>)
-            {
-                if (mbStreamed)
-                {
-                    kernels::StreamRow(vdfResults, pOut);
-                    return;
-                }
-            }
-            StoreSamples(vdfResults, pOut);
-            return;
-        }
-        WriteMasked(oStatistics, vdfResults, pOut);
+        mbMasked ? WriteMasked(oStatistics, vdfResults, pOut) : WriteAll(vdfResults, pOut);
     }
 
 private:
     /// Well above the caches of a core.
     static constexpr std::uint64_t kStreamedBytes = std::uint64_t{16} << 20;
 
+    /// True where the padding still lies in the row: the next stretch writes over it.
+    bool CanFinishInPlace(const WindowStatistics& oStatistics) const
+    {
+        const std::size_t nRow = std::size_t{moOut.mnWidth} * moOut.mnChannels;
+        return !mbMasked && !mbStreamed && oStatistics.mnFirst + oStatistics.GetPadded() <= nRow;
+    }
+
+    void WriteAll(std::span<const double> vdfResults, TSample* pOut) const
+    {
+        if constexpr (std::is_same_v<TSample, double>)
+        {
+            if (mbStreamed)
+            {
+                kernels::StreamRow(vdfResults, pOut);
+                return;
+            }
+        }
+        StoreSamples(vdfResults, pOut);
+    }
+
     void WriteMasked(const WindowStatistics& oStatistics, std::span<const double> vdfResults,
                      TSample* pOut)
     {
         const std::size_t nChannels = moIn.mnChannels;
-        const std::size_t nPixels = oStatistics.mnSamples / nChannels;
         const TSample* pIn =
             moIn.GetPixelAs<const TSample>(0, oStatistics.mnRow) + oStatistics.mnFirst;
-        mvComputed.resize(std::max(mvComputed.size(), nPixels));
-        const std::span<unsigned char> oComputed(mvComputed.data(), nPixels);
+        mvComputed.resize(oStatistics.mnSamples / nChannels);
         FindComputedPixels(mpoMaskIn, mpoMaskOut,
                            static_cast<std::int64_t>(oStatistics.mnFirst / nChannels),
-                           oStatistics.mnRow, oComputed);
+                           oStatistics.mnRow, mvComputed);
         if constexpr (std::is_same_v<TSample, double>)
         {
-            const unsigned char* pComputed = oComputed.data();
-            if (nChannels != 1)
-            {
-                mvComputedSamples.resize(std::max(mvComputedSamples.size(), vdfResults.size()));
-                RepeatForChannels<unsigned char>(oComputed, nChannels, mvComputedSamples.data());
-                pComputed = mvComputedSamples.data();
-            }
+            const unsigned char* pComputed = ComputedSamples(nChannels);
             const std::span<double> vdfOut(pOut, vdfResults.size());
             mbBGZero ? kernels::ClearMasked(pComputed, vdfResults.data(), vdfOut)
                      : kernels::SelectValid(pComputed, vdfResults.data(), pIn, vdfOut);
-            return;
         }
-        StoreSamples(vdfResults, pOut);
-        WriteBackground(oComputed, pIn, nChannels, mbBGZero, pOut);
+        else
+        {
+            StoreSamples(vdfResults, pOut);
+            WriteBackground<TSample, TSample>(mvComputed, pIn, nChannels, mbBGZero, pOut);
+        }
+    }
+
+    /// mvComputed for samples instead of pixels.
+    const unsigned char* ComputedSamples(std::size_t nChannels)
+    {
+        if (nChannels == 1)
+        {
+            return mvComputed.data();
+        }
+        mvComputedSamples.resize(mvComputed.size() * nChannels);
+        RepeatForChannels<unsigned char>(mvComputed, nChannels, mvComputedSamples.data());
+        return mvComputedSamples.data();
     }
 
     const tessel::Raster& moIn;
