@@ -45,7 +45,7 @@ public:
 private:
     void TakeLayout();
     void RequireUpdate(const char* pszTask) const;
-    void AddChannels(const tessel::RasterInfo& oInfo);
+    [[noreturn]] void RefuseMoreChannels(const tessel::RasterInfo& oInfo) const;
 
     std::string moFile;
     std::string moFormat;
