@@ -97,18 +97,24 @@ public:
 
     StageTimes Run()
     {
-        const StageClock oClock(moTimes.mdfTotal);
-        const OMPNested oNested(true);
-        if (mvoBlocks.empty() || !RunSteps())
         {
-            return moTimes;
+            const StageClock oClock(moTimes.mdfTotal);
+            RunAll();
         }
-        WriteBlock(mvoBlocks.size() - 1);
-        moWork.SetProgress(1.0F);
         return moTimes;
     }
 
 private:
+    void RunAll()
+    {
+        const OMPNested oNested(true);
+        if (!mvoBlocks.empty() && RunSteps())
+        {
+            WriteBlock(mvoBlocks.size() - 1);
+            moWork.SetProgress(1.0F);
+        }
+    }
+
     /// False when the run was cancelled.
     bool RunSteps()
     {

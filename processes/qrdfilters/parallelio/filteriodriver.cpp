@@ -17,6 +17,34 @@ const datasources::IRasterAccess& SourceOf(const datasources::IRasterReader* poR
     return *poWriter;
 }
 
+/// The writer, or where there is none the reader: what tells the extent of the output.
+const datasources::IRasterAccess& OutputOf(const datasources::IRasterReader* poReader,
+                                           const datasources::IRasterWriter* poWriter)
+{
+    if (poWriter != nullptr)
+    {
+        return *poWriter;
+    }
+    return *poReader;
+}
+
+/// The record of a block of the output; without a writer it is shaped like what is read.
+BlockRecord BlockAt(DefaultAccessPolicy& oPolicy, const tessel::RasterContext& oContext,
+                    const tessel::RasterInfo& oInfo, bool bNoWriter, bool bKeepOutputMargins)
+{
+    BlockRecord oBlock;
+    oBlock.moInputContext = oPolicy.GetReadContext(oContext, oInfo);
+    oBlock.moInputInfo = oPolicy.GetReadInfo(oContext, oInfo);
+    oBlock.moOutputInfo = bNoWriter ? oBlock.moInputInfo : oInfo;
+    oBlock.moOutputContext = oBlock.moInputContext;
+    if (!bKeepOutputMargins)
+    {
+        oBlock.moOutputContext.mnMarginX = 0;
+        oBlock.moOutputContext.mnMarginY = 0;
+    }
+    return oBlock;
+}
+
 std::uint64_t PixelBytes(const datasources::IRasterAccess& oAccess)
 {
     return (std::uint64_t{oAccess.GetChannelCount()} * oAccess.GetDataType().mnBits) >> 3;
@@ -74,39 +102,22 @@ std::vector<BlockRecord> CutIntoBlocks(DefaultAccessPolicy& oPolicy,
     FindOptimalRasterSize(poReader, poWriter, nMaxPixels, nBlockWidth, nBlockHeight,
                           ProcessWindow());
 
-    const datasources::IRasterAccess* poImage = poWriter;
-    if (poImage == nullptr)
-    {
-        poImage = poReader;
-    }
-    const std::uint32_t nWidth = poImage->GetWidth();
-    const std::uint32_t nHeight = poImage->GetHeight();
+    const datasources::IRasterAccess& oImage = OutputOf(poReader, poWriter);
     std::vector<BlockRecord> voBlocks;
-    for (std::uint32_t y = 0, nRows = 0; y < nHeight; y += nRows)
+    for (std::uint32_t y = 0; y < oImage.GetHeight();
+         y += std::min(nBlockHeight, oImage.GetHeight() - y))
     {
-        nRows = std::min(nBlockHeight, nHeight - y);
-        for (std::uint32_t x = 0, nColumns = 0; x < nWidth; x += nColumns)
+        for (std::uint32_t x = 0; x < oImage.GetWidth();
+             x += std::min(nBlockWidth, oImage.GetWidth() - x))
         {
-            nColumns = std::min(nBlockWidth, nWidth - x);
+            const tessel::RasterInfo oInfo(std::min(nBlockWidth, oImage.GetWidth() - x),
+                                           std::min(nBlockHeight, oImage.GetHeight() - y),
+                                           oImage.GetChannelCount(), oImage.GetDataType());
             const tessel::RasterContext oContext(poReader != nullptr ? poReader->GetMarginX() : 0,
                                                  poReader != nullptr ? poReader->GetMarginY() : 0,
                                                  x, y);
-            BlockRecord oBlock;
-            oBlock.moOutputInfo = tessel::RasterInfo(nColumns, nRows, poImage->GetChannelCount(),
-                                                     poImage->GetDataType());
-            oBlock.moInputContext = oPolicy.GetReadContext(oContext, oBlock.moOutputInfo);
-            oBlock.moInputInfo = oPolicy.GetReadInfo(oContext, oBlock.moOutputInfo);
-            if (poWriter == nullptr)
-            {
-                oBlock.moOutputInfo = oBlock.moInputInfo;
-            }
-            oBlock.moOutputContext = oBlock.moInputContext;
-            if (!bKeepOutputMargins)
-            {
-                oBlock.moOutputContext.mnMarginX = 0;
-                oBlock.moOutputContext.mnMarginY = 0;
-            }
-            voBlocks.push_back(oBlock);
+            voBlocks.push_back(
+                BlockAt(oPolicy, oContext, oInfo, poWriter == nullptr, bKeepOutputMargins));
         }
     }
     return voBlocks;
