@@ -1,10 +1,12 @@
 #pragma once
 
 #include <algorithm>
+#include <cstddef>
 #include <cstdint>
 #include <span>
 
 #include "basic/tessel/mask/mask.h"
+#include "processes/qrdfilters/findbyte.h"
 #include "processes/qrdfilters/samplerows.h"
 
 namespace kor::filters
@@ -22,12 +24,12 @@ template <class TIn, class TOut>
 void WriteBackground(std::span<const unsigned char> oComputed, const TIn* pIn,
                      std::size_t nChannels, bool bBGZero, TOut* pOut)
 {
-    auto itFirst = std::find(oComputed.begin(), oComputed.end(), 0);
-    while (itFirst != oComputed.end())
+    std::size_t nFirst = FindByte(oComputed, 0, 0);
+    while (nFirst != oComputed.size())
     {
-        const auto itEnd = std::find(itFirst, oComputed.end(), 1);
-        const auto nStart = static_cast<std::size_t>(itFirst - oComputed.begin()) * nChannels;
-        const auto nCount = static_cast<std::size_t>(itEnd - itFirst) * nChannels;
+        const std::size_t nEnd = FindByte(oComputed, nFirst, 1);
+        const std::size_t nStart = nFirst * nChannels;
+        const std::size_t nCount = (nEnd - nFirst) * nChannels;
         if (bBGZero)
         {
             std::fill_n(pOut + nStart, nCount, TOut(0));
@@ -36,7 +38,7 @@ void WriteBackground(std::span<const unsigned char> oComputed, const TIn* pIn,
         {
             ConvertSamples<TIn, TOut>(pIn + nStart, pOut + nStart, nCount);
         }
-        itFirst = std::find(itEnd, oComputed.end(), 0);
+        nFirst = FindByte(oComputed, nEnd, 0);
     }
 }
 
