@@ -30,7 +30,7 @@ constexpr TOut RoundAndClamp(TIn x)
         bPowerOfTwo ? static_cast<TIn>(static_cast<double>(kHighest) + 1.0) : TIn(kHighest);
     constexpr TIn kHalf = TIn(0.5);
 
-    if (x != x)
+    if (x != x)  // NOLINT(misc-redundant-expression): not a number, in a constant expression too
     {
         return 0;
     }
