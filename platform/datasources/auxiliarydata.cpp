@@ -1,0 +1,54 @@
+#include "platform/datasources/auxiliarydata.h"
+
+#include "platform/exception/exception.h"
+
+namespace kor::datasources
+{
+
+AuxiliaryData::Channel AuxiliaryData::GetChannel(unsigned int nChannel) const
+{
+    const auto itChannel = moChannels.find(nChannel);
+    return itChannel == moChannels.end() ? Channel() : itChannel->second;
+}
+
+AuxiliaryData::Channel& AuxiliaryData::EntryOf(unsigned int nChannel)
+{
+    if (nChannel == 0)
+    {
+        throw DataException("nChannel is 0; channels are numbered from 1",
+                            "platform/datasources/auxiliarydata", __PRETTY_FUNCTION__, __LINE__);
+    }
+    return moChannels[nChannel];
+}
+
+std::string AuxiliaryData::GetChannelDescription(unsigned int nChannel) const
+{
+    return GetChannel(nChannel).moDescription;
+}
+
+void AuxiliaryData::SetChannelDescription(const std::string& oText, unsigned int nChannel)
+{
+    EntryOf(nChannel).moDescription = oText;
+}
+
+AuxiliaryData::Metadata AuxiliaryData::GetChanMetadata(unsigned int nChannel) const
+{
+    return GetChannel(nChannel).moMetadata;
+}
+
+void AuxiliaryData::SetChanMetadata(const Metadata& oMetadata, unsigned int nChannel)
+{
+    EntryOf(nChannel).moMetadata = oMetadata;
+}
+
+std::optional<double> AuxiliaryData::GetChannelNoData(unsigned int nChannel) const
+{
+    return GetChannel(nChannel).mdfNoData;
+}
+
+void AuxiliaryData::SetChannelNoData(std::optional<double> dfNoData, unsigned int nChannel)
+{
+    EntryOf(nChannel).mdfNoData = dfNoData;
+}
+
+}  // namespace kor::datasources

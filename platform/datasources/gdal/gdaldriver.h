@@ -1,0 +1,42 @@
+#pragma once
+
+#include <string>
+
+#include "basic/tessel/raster/raster.h"
+
+namespace kor::datasources
+{
+
+/// Makes the files that GDAL knows known to DatasetManager. Needed once in a program, before the
+/// first file is opened; more calls do nothing. May be called from any thread.
+///
+/// Opened are files of these formats: GTiff, COG, ENVI, EHdr, HFA, AAIGrid, SRTMHGT, JP2OpenJPEG,
+/// PNG, JPEG, as far as the GDAL at hand has them; DatasetManager::AllowDriver adds one by its GDAL
+/// name, except VRT, whose files refer to others and are never opened. GDAL's own settings (its
+/// block cache among them) stay as the program has set them.
+///
+/// Made are files of the formats of these that can be written block by block: GTiff, ENVI, EHdr,
+/// HFA. The file comes into being with CreateChannels, which has to be called before anything else
+/// is set; a second call adds channels only where the format can do that, which none of these four
+/// can. All channels of a file have one type. eDT_BIT, eDT_C16U and eDT_C32U do not exist in GDAL
+/// and are refused, as is a type that the format does not have. A dataset that is destroyed before
+/// CreateChannels leaves no file.
+///
+/// Reading     each reader has a handle of its own on a file opened for reading. On a file that is
+///             being written, all readers and writers take turns at one handle.
+/// Samples     are never converted by GDAL. 8-bit bands marked as signed bytes are eDT_8S.
+/// No data     GTiff has one value for the whole file: a second, different one is refused, and
+///             channels that were given none show it too when the file is opened again. Blocks of a
+///             GTiff that were never written hold it.
+/// Flush       closes the file, so that every error has shown when it returns, and opens it anew
+///             when it is used again.
+/// Errors      what GDAL reports is in the messages; nothing is printed.
+void RegisterGdalDriver();
+
+/// Writes the inner area of an eDT_8U raster of one channel (grey) or three (red, green, blue) as a
+/// PNG picture. An older picture of that name is replaced, and only by a whole one: the picture is
+/// written beside it under another name first. No other file is left. Throws kor::DataException
+/// when the raster is of another kind or empty, kor::FileException when the file cannot be written.
+void WritePng(const std::string& oFile, const tessel::Raster& oRaster);
+
+}  // namespace kor::datasources
