@@ -60,8 +60,13 @@ install_packages() # GROUP...
     if [ "$(id -u)" != 0 ] && ! command -v sudo >/dev/null; then
         fail "These packages are missing, and installing them takes root:" "    $command"
     fi
-    apt update || echo "apt-get update failed; going on with the package lists that are there."
+    mkdir -p build
+    echo "Installing, with what they depend on; apt's own words go to build/packages.log"
+    apt update >build/packages.log 2>&1 ||
+        echo "apt-get update failed; going on with the package lists that are there."
     # shellcheck disable=SC2086
-    apt install -y --no-install-recommends $missing ||
+    if ! apt install -y --no-install-recommends $missing >>build/packages.log 2>&1; then
+        tail -n 20 build/packages.log >&2
         fail "The packages could not be installed. By hand, as root:" "    $command"
+    fi
 }
