@@ -22,14 +22,36 @@ using kernels::BatchColumn;
 using kernels::kBatchRows;
 using kernels::PadRow;
 
-/// Repeats each entry for the channels of its pixel.
-template <class T>
-void RepeatForChannels(std::span<const T> oPixels, std::size_t nChannels, T* pSamples)
+/// Repeats each entry for the channels of its pixel. The usual numbers of channels get loops of
+/// their own, which are several times as fast.
+template <std::size_t kChannels, class T>
+void RepeatForChannels(std::span<const T> oPixels, T* pSamples)
 {
     for (const T nPixel : oPixels)
     {
-        std::fill_n(pSamples, nChannels, nPixel);
-        pSamples += nChannels;
+        for (std::size_t c = 0; c < kChannels; ++c)
+        {
+            *pSamples++ = nPixel;
+        }
+    }
+}
+
+template <class T>
+void RepeatForChannels(std::span<const T> oPixels, std::size_t nChannels, T* pSamples)
+{
+    switch (nChannels)
+    {
+        case 2:
+            return RepeatForChannels<2>(oPixels, pSamples);
+        case 3:
+            return RepeatForChannels<3>(oPixels, pSamples);
+        case 4:
+            return RepeatForChannels<4>(oPixels, pSamples);
+        default:
+            for (const T nPixel : oPixels)
+            {
+                pSamples = std::fill_n(pSamples, nChannels, nPixel);
+            }
     }
 }
 
@@ -217,7 +239,7 @@ public:
           mbSquared(bSquared),
           mvdfColumns(oStretches.GetColumns() + kernels::kRowPadding),
           mvoColumns(oStretches.mnLongest + oStretches.mnSpan + kernels::kRowPadding),
-          mvoWindows(oStretches.mnLongest + oStretches.mnChannels),
+          mvoRunning(oStretches.mnChannels),
           mvdfRows(kBatchRows * oStretches.mnLongest)
     {
     }
@@ -238,37 +260,23 @@ public:
     /// The windows of a batch of rows.
     void SumBatch(const kernels::BatchRows& oRows, std::size_t nFirst, std::size_t nSamples)
     {
-        const std::size_t nChannels = moStretches.mnChannels;
+        // The column that leaves the window of sample i is mvoColumns[i], the one that enters it
+        // mvoColumns[i + nSpan].
         const std::size_t nSpan = moStretches.mnSpan;
-        // mvoWindows begins with the last pixel of the stretch before. The column that leaves the
-        // window of sample i is mvoColumns[i], the one that enters it mvoColumns[i + nSpan].
-        BatchColumn* poWindows = mvoWindows.data() + nChannels;
         if (nFirst == 0)
         {
+            const std::size_t nChannels = moStretches.mnChannels;
             SlideColumns(oRows, 0, nSamples - nChannels + nSpan, nChannels);
-            for (std::size_t c = 0; c < nChannels; ++c)
-            {
-                kernels::SumBatchWindow(&mvoColumns[nChannels + c], nSpan / nChannels, nChannels,
-                                        poWindows[c]);
-            }
-            kernels::SlideWindows(&mvoColumns[nChannels], nSpan, nChannels, nSamples - nChannels,
-                                  poWindows + nChannels);
+            StartRows();
+            SlideWindows(nChannels, nSamples - nChannels);
         }
         else
         {
             std::copy_n(mvoColumns.begin() + static_cast<std::ptrdiff_t>(moStretches.mnLongest),
                         nSpan, mvoColumns.begin());
-            std::copy_n(mvoWindows.begin() + static_cast<std::ptrdiff_t>(moStretches.mnLongest),
-                        nChannels, mvoWindows.begin());
-            SlideColumns(oRows, nFirst - nChannels + nSpan, nSamples, nSpan);
-            kernels::SlideWindows(mvoColumns.data(), nSpan, nChannels, nSamples, poWindows);
+            SlideColumns(oRows, nFirst - moStretches.mnChannels + nSpan, nSamples, nSpan);
+            SlideWindows(0, nSamples);
         }
-        std::array<double*, kBatchRows> apRows{};
-        for (std::size_t r = 0; r < kBatchRows; ++r)
-        {
-            apRows[r] = &mvdfRows[r * moStretches.mnLongest];
-        }
-        kernels::SplitBatch(poWindows, nSamples, apRows);
     }
 
     /// The window sums of row r of the batch.
@@ -282,11 +290,37 @@ private:
                               &mvoColumns[nPlace]);
     }
 
+    /// The first pixel of each row, from scratch.
+    void StartRows()
+    {
+        const std::size_t nChannels = moStretches.mnChannels;
+        for (std::size_t c = 0; c < nChannels; ++c)
+        {
+            kernels::SumBatchWindow(&mvoColumns[nChannels + c], moStretches.mnSpan / nChannels,
+                                    nChannels, mvoRunning[c]);
+            for (std::size_t r = 0; r < kBatchRows; ++r)
+            {
+                mvdfRows[r * moStretches.mnLongest + c] = mvoRunning[c].madfRows[r];
+            }
+        }
+    }
+
+    void SlideWindows(std::size_t nFrom, std::size_t nCount)
+    {
+        std::array<double*, kBatchRows> apRows{};
+        for (std::size_t r = 0; r < kBatchRows; ++r)
+        {
+            apRows[r] = &mvdfRows[r * moStretches.mnLongest + nFrom];
+        }
+        kernels::SlideWindows(&mvoColumns[nFrom], moStretches.mnSpan, nCount,
+                              moStretches.mnChannels, mvoRunning.data(), apRows);
+    }
+
     const Stretches& moStretches;
     bool mbSquared;
     std::vector<double> mvdfColumns;
     std::vector<BatchColumn> mvoColumns;
-    std::vector<BatchColumn> mvoWindows;
+    std::vector<BatchColumn> mvoRunning;
     std::vector<double> mvdfRows;
 };
 
@@ -299,17 +333,13 @@ public:
           moWindow(oWindow),
           mpoValid(poValid),
           mnColumns(oStretches.GetColumns() / oStretches.mnChannels),
-          mvdfCounts(oStretches.mnLongest + kernels::kRowPadding,
+          mnRow(PadRow(mnColumns) + kernels::kRowPadding),
+          mvdfCounts(oStretches.mnLongest,
                      static_cast<double>(oWindow.GetWidth() * oWindow.GetHeight()))
     {
         if (mpoValid != nullptr)
         {
-            mvnColumns.resize(mnColumns + kernels::kCountPadding);
-            mvnBatch.resize(kBatchRows * mvnColumns.size());
-            const std::size_t nScratch = oStretches.mnLongest / oStretches.mnChannels +
-                                         oWindow.GetWidth() + kernels::kCountPadding;
-            mvnPowers.resize(nScratch);
-            mvnWindows.resize(nScratch);
+            mvnColumns.resize(kBatchRows * mnRow);
             mvdfPixels.resize(oStretches.mnLongest / oStretches.mnChannels);
         }
     }
@@ -325,26 +355,25 @@ public:
         const std::int64_t nHalfY = moWindow.mnHalfY;
         for (std::int64_t y = -nHalfY; y <= nHalfY; ++y)
         {
-            kernels::SlideCounts(vNone.data(), mpoValid->Pixels(y), {mvnColumns.data(), mnColumns});
+            kernels::SlideCounts(Columns(0), vNone.data(), mpoValid->Pixels(y),
+                                 {Columns(0), mnColumns});
         }
-        std::copy(mvnColumns.begin(), mvnColumns.end(), mvnBatch.begin());
     }
 
-    /// Moves the columns from row nRow - 1 to row nRow of the block, which is row r of its batch.
-    void SlideTo(std::int64_t nRow, std::size_t r)
+    /// Moves the columns from row nRow - 1 to row nRow of the block.
+    void SlideTo(std::int64_t nRow)
     {
         if (mpoValid == nullptr)
         {
             return;
         }
-        kernels::SlideCounts(mpoValid->Pixels(nRow - moWindow.mnHalfY - 1),
-                             mpoValid->Pixels(nRow + moWindow.mnHalfY),
-                             {mvnColumns.data(), mnColumns});
-        std::copy(mvnColumns.begin(), mvnColumns.end(), Batch(r));
+        kernels::SlideCounts(Columns(nRow - 1), mpoValid->Pixels(nRow - moWindow.mnHalfY - 1),
+                             mpoValid->Pixels(nRow + moWindow.mnHalfY), {Columns(nRow), mnColumns});
     }
 
-    /// The counts of a stretch in row r of the batch, valid until the next call.
-    const double* Row(std::size_t r, std::size_t nFirst, std::size_t nSamples)
+    /// The counts of a stretch of row nRow, which is among the last kBatchRows rows; they hold
+    /// until the next call.
+    const double* Row(std::int64_t nRow, std::size_t nFirst, std::size_t nSamples)
     {
         if (mpoValid == nullptr)
         {
@@ -352,10 +381,8 @@ public:
         }
         const std::size_t nChannels = moStretches.mnChannels;
         const std::size_t nPixels = nSamples / nChannels;
-        std::copy_n(Batch(r) + static_cast<std::ptrdiff_t>(nFirst / nChannels),
-                    nPixels + moWindow.GetWidth() - 1, mvnPowers.begin());
-        kernels::SumCounts(mvnPowers.data(), moWindow.GetWidth(),
-                           {mvnWindows.data(), PadRow(nPixels)}, {mvdfPixels.data(), nPixels});
+        kernels::SumCounts(Columns(nRow) + nFirst / nChannels, moWindow.GetWidth(),
+                           {mvdfPixels.data(), nPixels});
         if (nChannels == 1)
         {
             return mvdfPixels.data();
@@ -365,19 +392,17 @@ public:
     }
 
 private:
-    std::vector<std::int32_t>::iterator Batch(std::size_t r)
+    std::int32_t* Columns(std::int64_t nRow)
     {
-        return mvnBatch.begin() + static_cast<std::ptrdiff_t>(r * mvnColumns.size());
+        return &mvnColumns[static_cast<std::size_t>(nRow) % kBatchRows * mnRow];
     }
 
     const Stretches& moStretches;
     Window moWindow;
     ValidRows* mpoValid;
     std::size_t mnColumns;
+    std::size_t mnRow;
     std::vector<std::int32_t> mvnColumns;
-    std::vector<std::int32_t> mvnBatch;
-    std::vector<std::int32_t> mvnPowers;
-    std::vector<std::int32_t> mvnWindows;
     std::vector<double> mvdfPixels;
     std::vector<double> mvdfCounts;
 };
@@ -465,7 +490,7 @@ private:
         }
         for (std::size_t r = 0; r < nRows; ++r)
         {
-            moCounts.SlideTo(static_cast<std::int64_t>(nFirstRow + r), r);
+            moCounts.SlideTo(static_cast<std::int64_t>(nFirstRow + r));
         }
         ForEachStretch(
             [&](std::size_t nFirst, std::size_t nSamples)
@@ -516,7 +541,7 @@ private:
         {
             oStatistics.mapSums[t] = mvoSums[t].Row(r);
         }
-        oStatistics.mpCounts = moCounts.Row(r, nFirst, nSamples);
+        oStatistics.mpCounts = moCounts.Row(nRow, nFirst, nSamples);
         oStatistics.mpCentres = Centres(nRow, nFirst, nSamples);
         moVisit(oStatistics);
     }
@@ -561,7 +586,8 @@ public:
           moFinish(oFinish),
           moOut(oOut),
           mpoMaskOut(poMaskOut),
-          mbMasked(poMaskIn != nullptr || poMaskOut != nullptr)
+          mbMasked(poMaskIn != nullptr || poMaskOut != nullptr),
+          mbStreamed(std::is_same_v<TSample, double> && oOut.mnBufferSize >= kStreamedBytes)
     {
     }
 
@@ -572,7 +598,7 @@ public:
         {
             // The padding is written over by the next stretch of the row.
             const std::size_t nRow = std::size_t{moOut.mnWidth} * moOut.mnChannels;
-            if (!mbMasked && oStatistics.mnFirst + oStatistics.GetPadded() <= nRow)
+            if (!mbMasked && !mbStreamed && oStatistics.mnFirst + oStatistics.GetPadded() <= nRow)
             {
                 moFinish(oStatistics, {pOut, oStatistics.GetPadded()});
                 return;
@@ -583,6 +609,14 @@ public:
         const std::span<const double> vdfResults(mvdfResults.data(), oStatistics.mnSamples);
         if (!mbMasked)
         {
+            if constexpr (std::is_same_v<TSample, double>)
+            {
+                if (mbStreamed)
+                {
+                    kernels::StreamRow(vdfResults, pOut);
+                    return;
+                }
+            }
             StoreSamples(vdfResults, pOut);
             return;
         }
@@ -590,6 +624,9 @@ public:
     }
 
 private:
+    /// Well above the caches of a core.
+    static constexpr std::uint64_t kStreamedBytes = std::uint64_t{16} << 20;
+
     void WriteMasked(const WindowStatistics& oStatistics, std::span<const double> vdfResults,
                      TSample* pOut)
     {
@@ -604,13 +641,17 @@ private:
                            oStatistics.mnRow, oComputed);
         if constexpr (std::is_same_v<TSample, double>)
         {
-            if (nChannels == 1)
+            const unsigned char* pComputed = oComputed.data();
+            if (nChannels != 1)
             {
-                const std::span<double> vdfOut(pOut, vdfResults.size());
-                mbBGZero ? kernels::ClearMasked(oComputed.data(), vdfResults.data(), vdfOut)
-                         : kernels::SelectValid(oComputed.data(), vdfResults.data(), pIn, vdfOut);
-                return;
+                mvComputedSamples.resize(std::max(mvComputedSamples.size(), vdfResults.size()));
+                RepeatForChannels<unsigned char>(oComputed, nChannels, mvComputedSamples.data());
+                pComputed = mvComputedSamples.data();
             }
+            const std::span<double> vdfOut(pOut, vdfResults.size());
+            mbBGZero ? kernels::ClearMasked(pComputed, vdfResults.data(), vdfOut)
+                     : kernels::SelectValid(pComputed, vdfResults.data(), pIn, vdfOut);
+            return;
         }
         StoreSamples(vdfResults, pOut);
         WriteBackground(oComputed, pIn, nChannels, mbBGZero, pOut);
@@ -623,8 +664,10 @@ private:
     tessel::Raster& moOut;
     const tessel::Mask* mpoMaskOut;
     bool mbMasked;
+    bool mbStreamed;
     std::vector<double> mvdfResults;
     std::vector<unsigned char> mvComputed;
+    std::vector<unsigned char> mvComputedSamples;
 };
 
 }  // namespace

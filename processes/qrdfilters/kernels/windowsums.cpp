@@ -197,66 +197,106 @@ void SumBatchWindow(const BatchColumn* poBatch, std::size_t nCount, std::size_t 
     }
 }
 
-/// One channel: the running sums stay in registers.
-void SlideWindowsOfOneChannel(const BatchColumn* poBatch, std::size_t nSpan, std::size_t nSamples,
-                              BatchColumn* poWindows)
+/// The sums of nChannels samples that move on along the row: in registers for one channel, since
+/// they depend on each other from sample to sample.
+template <bool kOneChannel>
+class RunningSums
 {
-    Vector aoSums[kGroups];
-    for (std::size_t g = 0; g < kGroups; ++g)
-    {
-        aoSums[g] = hn::Load(kTag, &poWindows[-1].madfRows[g * kLanes]);
-    }
-    for (std::size_t i = 0; i < nSamples; ++i)
+public:
+    RunningSums(BatchColumn* poSums, std::size_t nChannels) : mpoSums(poSums), mnChannels(nChannels)
     {
         for (std::size_t g = 0; g < kGroups; ++g)
         {
-            aoSums[g] = hn::Sub(aoSums[g], hn::Load(kTag, &poBatch[i].madfRows[g * kLanes]));
-            aoSums[g] =
-                hn::Add(aoSums[g], hn::Load(kTag, &poBatch[i + nSpan].madfRows[g * kLanes]));
-            hn::Store(aoSums[g], kTag, &poWindows[i].madfRows[g * kLanes]);
+            maoSums[g] = hn::Load(kTag, &mpoSums->madfRows[g * kLanes]);
         }
+    }
+
+    /// The next sample: a column leaves, another one enters.
+    HWY_INLINE void Move(const BatchColumn& oLeaving, const BatchColumn& oEntering)
+    {
+        for (std::size_t g = 0; g < kGroups; ++g)
+        {
+            double* pSum = &mpoSums[mnChannel].madfRows[g * kLanes];
+            const Vector oBefore = kOneChannel ? maoSums[g] : hn::Load(kTag, pSum);
+            const Vector oLess = hn::Sub(oBefore, hn::Load(kTag, &oLeaving.madfRows[g * kLanes]));
+            maoSums[g] = hn::Add(oLess, hn::Load(kTag, &oEntering.madfRows[g * kLanes]));
+            if (!kOneChannel)
+            {
+                hn::Store(maoSums[g], kTag, pSum);
+            }
+        }
+        if (!kOneChannel)
+        {
+            mnChannel = mnChannel + 1 == mnChannels ? 0 : mnChannel + 1;
+        }
+    }
+
+    HWY_INLINE Vector Group(std::size_t g) const { return maoSums[g]; }
+
+    void StoreTo(BatchColumn& oSums) const
+    {
+        for (std::size_t g = 0; g < kGroups; ++g)
+        {
+            hn::Store(maoSums[g], kTag, &oSums.madfRows[g * kLanes]);
+        }
+    }
+
+private:
+    BatchColumn* mpoSums;
+    std::size_t mnChannels;
+    std::size_t mnChannel = 0;
+    Vector maoSums[kGroups];
+};
+
+template <bool kOneChannel>
+void SlideWindowsOf(const BatchColumn* poColumns, std::size_t nSpan, std::size_t nSamples,
+                    std::size_t nChannels, BatchColumn* poSums,
+                    const std::array<double*, kBatchRows>& apRows)
+{
+    RunningSums<kOneChannel> oSums(poSums, nChannels);
+    std::size_t i = 0;
+    for (; i + kLanes <= nSamples; i += kLanes)
+    {
+        Vector aaoSquares[kGroups][kLanes];
+        for (std::size_t k = 0; k < kLanes; ++k)
+        {
+            oSums.Move(poColumns[i + k], poColumns[i + k + nSpan]);
+            for (std::size_t g = 0; g < kGroups; ++g)
+            {
+                aaoSquares[g][k] = oSums.Group(g);
+            }
+        }
+        for (std::size_t g = 0; g < kGroups; ++g)
+        {
+            Transpose(aaoSquares[g]);
+            for (std::size_t k = 0; k < kLanes; ++k)
+            {
+                hn::StoreU(aaoSquares[g][k], kTag, apRows[g * kLanes + k] + i);
+            }
+        }
+    }
+    for (; i < nSamples; ++i)
+    {
+        BatchColumn oLast;
+        oSums.Move(poColumns[i], poColumns[i + nSpan]);
+        oSums.StoreTo(oLast);
+        for (std::size_t r = 0; r < kBatchRows; ++r)
+        {
+            apRows[r][i] = oLast.madfRows[r];
+        }
+    }
+    if (kOneChannel)
+    {
+        oSums.StoreTo(*poSums);
     }
 }
 
-void SlideWindows(const BatchColumn* poBatch, std::size_t nSpan, std::size_t nStep,
-                  std::size_t nSamples, BatchColumn* poWindows)
+void SlideWindows(const BatchColumn* poColumns, std::size_t nSpan, std::size_t nSamples,
+                  std::size_t nChannels, BatchColumn* poSums,
+                  const std::array<double*, kBatchRows>& apRows)
 {
-    if (nStep == 1)
-    {
-        SlideWindowsOfOneChannel(poBatch, nSpan, nSamples, poWindows);
-        return;
-    }
-    for (std::size_t i = 0; i < nSamples; ++i)
-    {
-        for (std::size_t r = 0; r < kBatchRows; r += kLanes)
-        {
-            Vector oSum = hn::Load(kTag, &(poWindows + i - nStep)->madfRows[r]);
-            oSum = hn::Sub(oSum, hn::Load(kTag, &poBatch[i].madfRows[r]));
-            oSum = hn::Add(oSum, hn::Load(kTag, &poBatch[i + nSpan].madfRows[r]));
-            hn::Store(oSum, kTag, &poWindows[i].madfRows[r]);
-        }
-    }
-}
-
-void SplitBatch(const BatchColumn* poWindows, std::size_t nSamples,
-                const std::array<double*, kBatchRows>& apRows)
-{
-    for (std::size_t i = 0; i < nSamples; i += kLanes)
-    {
-        for (std::size_t nGroup = 0; nGroup < kGroups; ++nGroup)
-        {
-            Vector aoSums[kLanes];
-            for (std::size_t k = 0; k < kLanes; ++k)
-            {
-                aoSums[k] = hn::Load(kTag, &poWindows[i + k].madfRows[nGroup * kLanes]);
-            }
-            Transpose(aoSums);
-            for (std::size_t k = 0; k < kLanes; ++k)
-            {
-                hn::StoreU(aoSums[k], kTag, apRows[nGroup * kLanes + k] + i);
-            }
-        }
-    }
+    nChannels == 1 ? SlideWindowsOf<true>(poColumns, nSpan, nSamples, nChannels, poSums, apRows)
+                   : SlideWindowsOf<false>(poColumns, nSpan, nSamples, nChannels, poSums, apRows);
 }
 
 /// Mask of the lanes whose byte is not 0.
@@ -299,62 +339,55 @@ void SelectValid(const unsigned char* pValid, const double* pIn, const double* p
     }
 }
 
-void SlideCounts(const unsigned char* pLeaving, const unsigned char* pEntering,
-                 std::span<std::int32_t> oCounts)
+void StreamRow(std::span<const double> oIn, double* pOut)
+{
+    // Partly written cache lines, at both ends, take the ordinary way.
+    constexpr std::size_t kLine = 64;
+    const std::size_t nBehindLine = reinterpret_cast<std::uintptr_t>(pOut) % kLine;
+    const std::size_t nHead = std::min(oIn.size(), (kLine - nBehindLine) % kLine / sizeof(double));
+    std::copy_n(oIn.data(), nHead, pOut);
+    std::size_t i = nHead;
+    for (; i + kRowPadding <= oIn.size(); i += kRowPadding)
+    {
+        for (std::size_t k = 0; k < kRowPadding; k += kLanes)
+        {
+            hn::Stream(hn::LoadU(kTag, &oIn[i + k]), kTag, pOut + i + k);
+        }
+    }
+    std::copy(oIn.begin() + static_cast<std::ptrdiff_t>(i), oIn.end(), pOut + i);
+}
+
+void SlideCounts(const std::int32_t* pBefore, const unsigned char* pLeaving,
+                 const unsigned char* pEntering, std::span<std::int32_t> oAfter)
 {
     const hn::ScalableTag<std::int32_t> oTag;
     const hn::Rebind<std::uint8_t, decltype(oTag)> oByteTag;
     const std::size_t nLanes = hn::Lanes(oTag);
     std::size_t i = 0;
-    for (; i + nLanes <= oCounts.size(); i += nLanes)
+    for (; i + nLanes <= oAfter.size(); i += nLanes)
     {
-        auto oCount = hn::LoadU(oTag, &oCounts[i]);
-        oCount = hn::Add(oCount, hn::PromoteTo(oTag, hn::LoadU(oByteTag, pEntering + i)));
-        oCount = hn::Sub(oCount, hn::PromoteTo(oTag, hn::LoadU(oByteTag, pLeaving + i)));
-        hn::StoreU(oCount, oTag, &oCounts[i]);
+        const auto oMore = hn::Add(hn::LoadU(oTag, pBefore + i),
+                                   hn::PromoteTo(oTag, hn::LoadU(oByteTag, pEntering + i)));
+        hn::StoreU(hn::Sub(oMore, hn::PromoteTo(oTag, hn::LoadU(oByteTag, pLeaving + i))), oTag,
+                   &oAfter[i]);
     }
-    for (; i < oCounts.size(); ++i)
+    for (; i < oAfter.size(); ++i)
     {
-        oCounts[i] += pEntering[i] - pLeaving[i];
-    }
-}
-
-/// oOut[i] = pFirst[i] + pSecond[i], whole vectors.
-void AddCounts(const std::int32_t* pFirst, const std::int32_t* pSecond, std::size_t nCount,
-               std::int32_t* pOut)
-{
-    const hn::ScalableTag<std::int32_t> oTag;
-    for (std::size_t i = 0; i < nCount; i += hn::Lanes(oTag))
-    {
-        hn::StoreU(hn::Add(hn::LoadU(oTag, pFirst + i), hn::LoadU(oTag, pSecond + i)), oTag,
-                   pOut + i);
+        oAfter[i] = pBefore[i] + pEntering[i] - pLeaving[i];
     }
 }
 
-void SumCounts(std::int32_t* pColumns, std::size_t nWindow, std::span<std::int32_t> oScratch,
-               std::span<double> oCounts)
+void SumCounts(const std::int32_t* pColumns, std::size_t nWindow, std::span<double> oCounts)
 {
-    // Sums of 1, 2, 4 ... columns in pColumns; the window is put together from those that its
-    // length has as binary digits.
-    const std::size_t nCounts = oCounts.size();
-    std::fill(oScratch.begin(), oScratch.end(), 0);
-    std::size_t nOffset = 0;
-    for (std::size_t nLength = 1; nLength <= nWindow; nLength *= 2)
+    const hn::Rebind<std::int32_t, Doubles> oIntTag;
+    for (std::size_t i = 0; i < oCounts.size(); i += kLanes)
     {
-        if ((nWindow & nLength) != 0)
+        auto oSum = hn::LoadU(oIntTag, pColumns + i);
+        for (std::size_t k = 1; k < nWindow; ++k)
         {
-            AddCounts(oScratch.data(), pColumns + nOffset, nCounts, oScratch.data());
-            nOffset += nLength;
+            oSum = hn::Add(oSum, hn::LoadU(oIntTag, pColumns + i + k));
         }
-        if (2 * nLength <= nWindow)
-        {
-            AddCounts(pColumns, pColumns + nLength, nCounts + nWindow - 2 * nLength, pColumns);
-        }
-    }
-    const hn::Rebind<std::int32_t, Doubles> oHalfTag;
-    for (std::size_t i = 0; i < nCounts; i += kLanes)
-    {
-        hn::StoreU(hn::PromoteTo(kTag, hn::LoadU(oHalfTag, &oScratch[i])), kTag, &oCounts[i]);
+        hn::StoreU(hn::PromoteTo(kTag, oSum), kTag, &oCounts[i]);
     }
 }
 
@@ -370,9 +403,9 @@ HWY_EXPORT(SlideColumns);
 HWY_EXPORT(SumWindows);
 HWY_EXPORT(SumBatchWindow);
 HWY_EXPORT(SlideWindows);
-HWY_EXPORT(SplitBatch);
 HWY_EXPORT(ClearMasked);
 HWY_EXPORT(SelectValid);
+HWY_EXPORT(StreamRow);
 HWY_EXPORT(SlideCounts);
 HWY_EXPORT(SumCounts);
 
@@ -399,16 +432,11 @@ void SumBatchWindow(const BatchColumn* poBatch, std::size_t nCount, std::size_t 
     HWY_DYNAMIC_DISPATCH(SumBatchWindow)(poBatch, nCount, nStep, oWindow);
 }
 
-void SlideWindows(const BatchColumn* poBatch, std::size_t nSpan, std::size_t nStep,
-                  std::size_t nSamples, BatchColumn* poWindows)
+void SlideWindows(const BatchColumn* poColumns, std::size_t nSpan, std::size_t nSamples,
+                  std::size_t nChannels, BatchColumn* poSums,
+                  const std::array<double*, kBatchRows>& apRows)
 {
-    HWY_DYNAMIC_DISPATCH(SlideWindows)(poBatch, nSpan, nStep, nSamples, poWindows);
-}
-
-void SplitBatch(const BatchColumn* poWindows, std::size_t nSamples,
-                const std::array<double*, kBatchRows>& apRows)
-{
-    HWY_DYNAMIC_DISPATCH(SplitBatch)(poWindows, nSamples, apRows);
+    HWY_DYNAMIC_DISPATCH(SlideWindows)(poColumns, nSpan, nSamples, nChannels, poSums, apRows);
 }
 
 void ClearMasked(const unsigned char* pValid, const double* pIn, std::span<double> oOut)
@@ -422,16 +450,20 @@ void SelectValid(const unsigned char* pValid, const double* pIn, const double* p
     HWY_DYNAMIC_DISPATCH(SelectValid)(pValid, pIn, pElse, oOut);
 }
 
-void SlideCounts(const unsigned char* pLeaving, const unsigned char* pEntering,
-                 std::span<std::int32_t> oCounts)
+void StreamRow(std::span<const double> oIn, double* pOut)
 {
-    HWY_DYNAMIC_DISPATCH(SlideCounts)(pLeaving, pEntering, oCounts);
+    HWY_DYNAMIC_DISPATCH(StreamRow)(oIn, pOut);
 }
 
-void SumCounts(std::int32_t* pColumns, std::size_t nWindow, std::span<std::int32_t> oScratch,
-               std::span<double> oCounts)
+void SlideCounts(const std::int32_t* pBefore, const unsigned char* pLeaving,
+                 const unsigned char* pEntering, std::span<std::int32_t> oAfter)
 {
-    HWY_DYNAMIC_DISPATCH(SumCounts)(pColumns, nWindow, oScratch, oCounts);
+    HWY_DYNAMIC_DISPATCH(SlideCounts)(pBefore, pLeaving, pEntering, oAfter);
+}
+
+void SumCounts(const std::int32_t* pColumns, std::size_t nWindow, std::span<double> oCounts)
+{
+    HWY_DYNAMIC_DISPATCH(SumCounts)(pColumns, nWindow, oCounts);
 }
 
 }  // namespace kor::filters::kernels

@@ -55,14 +55,12 @@ void SumWindows(const double* pColumns, std::size_t nCount, std::size_t nStep,
 void SumBatchWindow(const BatchColumn* poBatch, std::size_t nCount, std::size_t nStep,
                     BatchColumn& oWindow);
 
-/// Moves the window sums of a batch along the row: poWindows[i] = poWindows[i - nStep] - poBatch[i]
-/// + poBatch[i + nSpan] for each of nSamples samples.
-void SlideWindows(const BatchColumn* poBatch, std::size_t nSpan, std::size_t nStep,
-                  std::size_t nSamples, BatchColumn* poWindows);
-
-/// apRows[r][i] = row r of poWindows[i], for PadRow(nSamples) samples.
-void SplitBatch(const BatchColumn* poWindows, std::size_t nSamples,
-                const std::array<double*, kBatchRows>& apRows);
+/// Moves the window sums of a batch along the row by nSamples samples: at each, column poColumns[i]
+/// is subtracted and then poColumns[i + nSpan] added. poSums holds the nChannels sums of the pixel
+/// before and ends as those of the last one; apRows[r][i] receives row r of sum i.
+void SlideWindows(const BatchColumn* poColumns, std::size_t nSpan, std::size_t nSamples,
+                  std::size_t nChannels, BatchColumn* poSums,
+                  const std::array<double*, kBatchRows>& apRows);
 
 /// oOut[i] = pValid[i] != 0 ? pIn[i] : +0.0. pIn may be oOut.
 void ClearMasked(const unsigned char* pValid, const double* pIn, std::span<double> oOut);
@@ -71,16 +69,15 @@ void ClearMasked(const unsigned char* pValid, const double* pIn, std::span<doubl
 void SelectValid(const unsigned char* pValid, const double* pIn, const double* pElse,
                  std::span<double> oOut);
 
-/// oCounts[i] += pEntering[i] - pLeaving[i]; pLeaving may be null.
-void SlideCounts(const unsigned char* pLeaving, const unsigned char* pEntering,
-                 std::span<std::int32_t> oCounts);
+/// Copies a row past the caches: for output that is much larger than they are.
+void StreamRow(std::span<const double> oIn, double* pOut);
 
-/// oCounts[i] = pColumns[i] + ... + pColumns[i + nWindow - 1] as double. The columns are used up as
-/// scratch; they and oScratch have room for oCounts.size() + nWindow + kCountPadding values.
-void SumCounts(std::int32_t* pColumns, std::size_t nWindow, std::span<std::int32_t> oScratch,
-               std::span<double> oCounts);
+/// oAfter[i] = pBefore[i] + pEntering[i] - pLeaving[i]. pBefore may be oAfter.
+void SlideCounts(const std::int32_t* pBefore, const unsigned char* pLeaving,
+                 const unsigned char* pEntering, std::span<std::int32_t> oAfter);
 
-/// Values that the count kernels may touch behind the last one.
-inline constexpr std::size_t kCountPadding = 16;
+/// oCounts[i] = pColumns[i] + ... + pColumns[i + nWindow - 1]. Reads and writes up to
+/// PadRow(oCounts.size()) counts.
+void SumCounts(const std::int32_t* pColumns, std::size_t nWindow, std::span<double> oCounts);
 
 }  // namespace kor::filters::kernels
