@@ -1,8 +1,9 @@
 #pragma once
 
-#include <cstdint>
+#include <algorithm>
 #include <limits>
 #include <type_traits>
+#include <utility>
 
 #include "basic/core/typedispatch/typelist.h"
 
@@ -21,13 +22,10 @@ namespace details
 template <class TOut, class TIn>
 constexpr TOut RoundAndClamp(TIn x)
 {
-    // Meant: the largest float below 2^31 or 2^32 is no limit of the integer, so a float is tested
-    // against the power of two and a double against the integer's own maximum.
-    constexpr bool bPowerOfTwo = std::is_same_v<TIn, float> && sizeof(TOut) == 4;
     constexpr TOut kHighest = std::numeric_limits<TOut>::max();
     constexpr TOut kLowest = std::numeric_limits<TOut>::min();
-    constexpr TIn kUpperTest =
-        bPowerOfTwo ? static_cast<TIn>(static_cast<double>(kHighest) + 1.0) : TIn(kHighest);
+    // Meant: float cannot hold 2^31 - 1 nor 2^32 - 1, so that its test is against the power of two.
+    constexpr auto kUpperTest = static_cast<TIn>(kHighest);
     constexpr TIn kHalf = TIn(0.5);
 
     if (x != x)  // NOLINT(misc-redundant-expression): not a number, in a constant expression too
@@ -60,40 +58,25 @@ constexpr TOut CutPositive(TIn x)
     return x >= kUpperTest ? std::numeric_limits<TOut>::max() : static_cast<TOut>(x);
 }
 
-/// Integer to a narrower or equally wide integer. The signed 64-bit type is clamped at its upper
-/// end alone and else gives its low bits; narrower signed ones lose their negative values on the
-/// way to any 64-bit type. Both are meant.
+/// Integer to another integer type. The signed 64-bit type is clamped at its upper end alone and
+/// else gives its low bits; narrower signed ones lose their negative values on the way to any
+/// 64-bit type. Both are meant.
 template <class TOut, class TIn>
 constexpr TOut ClampInteger(TIn x)
 {
-    if constexpr (std::is_same_v<TIn, int64> && std::is_same_v<TOut, uint64>)
-    {
-        return static_cast<TOut>(x);
-    }
-    else if constexpr (std::is_same_v<TIn, int64>)
-    {
-        constexpr int64 kHighest{std::numeric_limits<TOut>::max()};
-        return x >= kHighest ? std::numeric_limits<TOut>::max() : static_cast<TOut>(x);
-    }
-    else if constexpr (std::is_same_v<TIn, uint64>)
-    {
-        constexpr auto kHighest = static_cast<uint64>(std::numeric_limits<TOut>::max());
-        return x >= kHighest ? std::numeric_limits<TOut>::max() : static_cast<TOut>(x);
-    }
-    else
-    {
-        // 32 bits and less: int64 holds every value of both sides.
-        constexpr bool bWide = sizeof(TOut) == 8;
-        constexpr int64 kHighest =
-            bWide ? std::numeric_limits<int64>::max() : int64(std::numeric_limits<TOut>::max());
-        constexpr int64 kLowest = bWide ? 0 : int64(std::numeric_limits<TOut>::min());
-        const int64 nValue = x;
-        return static_cast<TOut>(nValue < kLowest    ? kLowest
-                                 : nValue > kHighest ? kHighest
-                                                     : nValue);
-    }
+    using In = std::numeric_limits<TIn>;
+    using Out = std::numeric_limits<TOut>;
+    // Limits in the source's own type: in a wider one the compiler finds no vectors for the loops.
+    constexpr TIn kHighest = std::in_range<TIn>(Out::max()) ? TIn(Out::max()) : In::max();
+    constexpr TIn kTargetsLowest = std::in_range<TIn>(Out::min()) ? TIn(Out::min()) : In::min();
+    constexpr TIn kLowest = std::is_same_v<TIn, int64> ? In::min()
+                            : sizeof(TOut) == 8        ? TIn(0)
+                                                       : kTargetsLowest;
+    return static_cast<TOut>(std::clamp(x, kLowest, kHighest));
 }
 
+/// Unsigned 64-bit integers are read as signed ones, and 2^64 is added where that gave a negative
+/// value, both in the target's precision: a value of more bits than that may be rounded twice.
 template <class TOut, class TIn>
 constexpr TOut ToFloatingPoint(TIn x)
 {
@@ -139,6 +122,45 @@ constexpr TOut ConvertSample(TIn xIn)
     else
     {
         return static_cast<TOut>(details::RoundAndClamp<AOut>(x));
+    }
+}
+
+/// re * re + im * im in the type of such a product (32-bit integers for narrower ones), cut to TOut
+/// without rounding or clamping. Integers wrap, and lose their high bits in a narrower TOut. So do
+/// floating-point sums, through the signed 64-bit type, in which what it cannot hold is -2^63; only
+/// the unsigned 64-bit type takes them by ConvertSample.
+template <class TIn, class TOut>
+constexpr TOut IntensitySample(TIn xRe, TIn xIm)
+{
+    using Part = Arithmetic<TIn>;
+    using Sum = decltype(Part() * Part());
+    const auto re = static_cast<Part>(xRe);
+    const auto im = static_cast<Part>(xIm);
+    if constexpr (std::is_integral_v<Sum>)
+    {
+        using Wrapping = std::make_unsigned_t<Sum>;
+        const auto nRe = static_cast<Wrapping>(re);
+        const auto nIm = static_cast<Wrapping>(im);
+        const auto nSum = static_cast<Sum>(nRe * nRe + nIm * nIm);
+        if constexpr (std::is_floating_point_v<TOut>)
+        {
+            return details::ToFloatingPoint<TOut>(nSum);
+        }
+        else
+        {
+            return static_cast<TOut>(nSum);
+        }
+    }
+    else if constexpr (std::is_floating_point_v<TOut> || std::is_same_v<TOut, uint64>)
+    {
+        return ConvertSample<Sum, TOut>(re * re + im * im);
+    }
+    else
+    {
+        constexpr Sum kLimit = 9223372036854775808.0;
+        const Sum dfSum = re * re + im * im;
+        return static_cast<TOut>(dfSum < kLimit ? static_cast<int64>(dfSum)
+                                                : std::numeric_limits<int64>::min());
     }
 }
 

@@ -90,9 +90,8 @@ public:
         explicit FirstDataTypeHolder(const tessel::DataType& oOut)
             : mpoSecond(VisitType<NativeTypeList>(
                   NativeCode(oOut),
-                  []<class T2>() -> std::unique_ptr<IConvertTo>
-                  { return std::make_unique<Op<T1, T2>>(); },
-                  []() -> std::unique_ptr<IConvertTo> { return nullptr; }))
+                  []<class T2>() -> IConvertTo* { return new Op<T1, T2>(); },
+                  []() -> IConvertTo* { return nullptr; }))
         {
         }
 

@@ -1,7 +1,7 @@
 #pragma once
 
+#include <array>
 #include <cstddef>
-#include <limits>
 #include <type_traits>
 
 #include "basic/tessel/raster/datatype.h"
@@ -51,6 +51,7 @@ constexpr tessel::DataType RealDataType()
 {
     constexpr auto nBits = static_cast<std::uint32_t>(sizeof(T) * 8);
     constexpr bool bFloat = std::is_floating_point_v<T>;
+    static_assert(sizeof(T) <= 8, "T is no element type");
     constexpr bool bSigned = std::is_same_v<T, char> || std::is_signed_v<T>;
     if constexpr (bFloat)
     {
@@ -91,10 +92,17 @@ constexpr std::size_t FindDataType(const tessel::DataType& oType, bool bExtendCo
     }
 }
 
+/// Number of the types in List.
+template <class List>
+inline constexpr std::size_t kListLength = 1 + kListLength<typename List::Tail>;
+template <>
+inline constexpr std::size_t kListLength<typeconv::priv::NullDataType> = 0;
+
 /// Calls oVisit<T>() on the type at position nIndex of List and returns what it returns, or
 /// oNone() when the list ends before.
 template <class List, class Visit, class None>
-auto VisitType(std::size_t nIndex, const Visit& oVisit, const None& oNone) -> decltype(oNone())
+constexpr auto VisitType(std::size_t nIndex, const Visit& oVisit, const None& oNone)
+    -> decltype(oNone())
 {
     if constexpr (std::is_same_v<List, typeconv::priv::NullDataType>)
     {
@@ -108,6 +116,36 @@ auto VisitType(std::size_t nIndex, const Visit& oVisit, const None& oNone) -> de
         }
         return VisitType<typename List::Tail>(nIndex - 1, oVisit, oNone);
     }
+}
+
+/// Position of element type T in StandardTypeList.
+template <class T>
+constexpr std::size_t ElementPosition()
+{
+    constexpr std::size_t nPosition = FindDataType<StandardTypeList>(RealDataType<T>(), false);
+    static_assert(nPosition < kListLength<StandardTypeList>, "T is no element type");
+    return nPosition;
+}
+
+/// A table with oMake<T1, T2>() at [i][k] for the types at the positions i and k of List.
+template <class List, class Make>
+constexpr auto MakePairTable(const Make& oMake)
+{
+    using Head = typename List::Head;
+    using Entry = decltype(oMake.template operator()<Head, Head>());
+    constexpr std::size_t kLength = kListLength<List>;
+    std::array<std::array<Entry, kLength>, kLength> aaoTable{};
+    for (std::size_t i = 0; i < kLength * kLength; ++i)
+    {
+        Entry& oEntry = aaoTable[i / kLength][i % kLength];
+        const auto oVisit = [&]<class T1>()
+        {
+            const auto oFill = [&]<class T2>() { oEntry = oMake.template operator()<T1, T2>(); };
+            VisitType<List>(i % kLength, oFill, [] {});
+        };
+        VisitType<List>(i / kLength, oVisit, [] {});
+    }
+    return aaoTable;
 }
 
 }  // namespace kor::typedispatch
