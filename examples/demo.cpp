@@ -20,7 +20,10 @@
 #include <numeric>
 #include <optional>
 #include <sstream>
+#include <stdexcept>
 #include <string>
+#include <system_error>
+#include <utility>
 #include <vector>
 
 #include "basic/tessel/mask/mask.h"
@@ -176,7 +179,8 @@ public:
         if (mvdfNoData.front())
         {
             std::ostringstream oText;
-            oText << *mvdfNoData.front() << ": such pixels enter no window and stay as they are";
+            oText << *mvdfNoData.front()
+                  << ": pixels with it in any channel enter no window and stay as they are";
             return oText.str();
         }
         return mbNeeded ? "no value named; only samples that are not finite are masked"
@@ -207,11 +211,10 @@ class Target
 public:
     Target(std::filesystem::path oFile, const Source& oSource)
         : moFile(std::move(oFile)),
-          moUnfinished(moFile.parent_path() /
-                       ("." + moFile.filename().string() + "." + std::to_string(getpid())))
+          moUnfinished(moFile.string() + "." + std::to_string(getpid()) + ".part")
     {
         mpoDataset.reset(datasources::DatasetManager::GetInstance()->NewDataset(
-            moUnfinished.string(), "GTiff", "COMPRESS=DEFLATE"));
+            moUnfinished.string(), "GTiff", "COMPRESS=DEFLATE BIGTIFF=IF_SAFER"));
         auto& oImage = dynamic_cast<datasources::IRasterDataset&>(*mpoDataset);
         oImage.CreateChannels(oSource.GetInfo());
         oImage.SetGeocodingInfo(oSource.GetReader().GetGeocodingInfo());
@@ -312,11 +315,9 @@ public:
         for (std::size_t c = 0; c < nShown; ++c)
         {
             const auto [fLow, fHigh] = oScale.Limits(c);
-            const float fRange = fHigh > fLow ? fHigh - fLow : 1.0F;
             for (std::size_t i = c; i < mvfSamples.size(); i += nShown)
             {
-                const float fShade = (mvfSamples[i] - fLow) / fRange * 255.0F;
-                oPixels.mpBuffer[i] = filters::ConvertSample<float, unsigned char>(fShade);
+                oPixels.mpBuffer[i] = Shade(mvfSamples[i], fLow, fHigh);
             }
         }
         datasources::WritePng(oFile.string(), oPixels);
@@ -327,14 +328,24 @@ public:
         std::string oText = mvnChannels.size() == 1 ? "channel" : "channels";
         for (const unsigned int nChannel : mvnChannels)
         {
-            oText += " " + std::to_string(nChannel);
+            oText.append(" ").append(std::to_string(nChannel));
         }
         return oText + ", each from its 2 % to its 98 % sample" +
-               (mnStep > 1 ? ", every " + std::to_string(mnStep) + "th pixel" : "");
+               (mnStep > 1 ? ", one row and column of " + std::to_string(mnStep) : "");
     }
 
 private:
     static constexpr float kMasked = std::numeric_limits<float>::quiet_NaN();
+
+    static unsigned char Shade(float fSample, float fLow, float fHigh)
+    {
+        if (std::isnan(fSample))
+        {
+            return 0;
+        }
+        const float fShare = (fSample - fLow) / (fHigh > fLow ? fHigh - fLow : 1.0F);
+        return static_cast<unsigned char>(std::clamp(fShare, 0.0F, 1.0F) * 255.0F + 0.5F);
+    }
 
     /// Red, green and blue where there are as many. Files of more than four channels are mostly
     /// ordered by wavelength, blue first.
@@ -366,14 +377,21 @@ public:
     {
     }
 
-    /// Runs the filter from oIn to a new block of the same type, with the clock running.
+    /// Runs the filter from oIn to a new block of the same type. The fastest of three runs counts:
+    /// the first one pays for threads and fresh memory.
     template <class Filter>
     std::unique_ptr<Raster> Run(const Filter& oFilter, Raster& oIn, Mask* poMask)
     {
+        using Clock = std::chrono::steady_clock;
         auto poOut = InnerBlock(oIn);
-        const auto oStart = std::chrono::steady_clock::now();
-        oFilter.Process(&oIn, poMask, poOut.get(), nullptr);
-        moTime += std::chrono::steady_clock::now() - oStart;
+        auto oFastest = Clock::duration::max();
+        for (int i = 0; i < 3; ++i)
+        {
+            const Clock::time_point oStart = Clock::now();
+            oFilter.Process(&oIn, poMask, poOut.get(), nullptr);
+            oFastest = std::min(oFastest, Clock::now() - oStart);
+        }
+        moTime += oFastest;
         return poOut;
     }
 
