@@ -22,15 +22,22 @@ OMPThreadCount::~OMPThreadCount()
     omp_set_num_threads(mnFormerCount);
 }
 
-OMPNested::OMPNested(bool bNested)
-    : mnFormerNested(omp_get_nested()), mnFormerLevels(omp_get_max_active_levels())
+// The number of active levels is what omp_get_nested tells and omp_set_nested sets; some run-times
+// print a warning when the latter is called.
+OMPNested::OMPNested(bool bNested) : mnFormerLevels(omp_get_max_active_levels())
 {
-    omp_set_nested(bNested ? 1 : 0);
+    if (!bNested)
+    {
+        omp_set_max_active_levels(1);
+    }
+    else if (mnFormerLevels <= 1)
+    {
+        omp_set_max_active_levels(omp_get_supported_active_levels());
+    }
 }
 
 OMPNested::~OMPNested()
 {
-    omp_set_nested(mnFormerNested);
     omp_set_max_active_levels(mnFormerLevels);
 }
 

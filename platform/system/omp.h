@@ -31,7 +31,6 @@ public:
     OMPNested& operator=(const OMPNested&) = delete;
 
 private:
-    int mnFormerNested;
     int mnFormerLevels;
 };
 

@@ -1,7 +1,8 @@
 #include "processes/qrdfilters/background.h"
 
+#include <array>
+#include <cstring>
 #include <functional>
-#include <vector>
 
 namespace kor::filters
 {
@@ -15,13 +16,30 @@ void FindComputedPixels(const tessel::Mask* poMaskIn, const tessel::Mask* poMask
         return;
     }
     (poMaskIn != nullptr ? poMaskIn : poMaskOut)->ExpandRow(x, y, oComputed);
-    if (poMaskIn != nullptr && poMaskOut != nullptr)
+    if (poMaskIn == nullptr || poMaskOut == nullptr)
     {
-        std::vector<unsigned char> vOut(oComputed.size());
-        poMaskOut->ExpandRow(x, y, vOut);
-        std::transform(oComputed.begin(), oComputed.end(), vOut.begin(), oComputed.begin(),
-                       std::bit_and<>());
+        return;
     }
+    std::array<unsigned char, 512> anOut{};
+    for (std::size_t i = 0; i < oComputed.size(); i += anOut.size())
+    {
+        const auto oPart = oComputed.subspan(i, std::min(anOut.size(), oComputed.size() - i));
+        poMaskOut->ExpandRow(x + static_cast<std::int64_t>(i), y, {anOut.data(), oPart.size()});
+        std::transform(oPart.begin(), oPart.end(), anOut.begin(), oPart.begin(), std::bit_and<>());
+    }
+}
+
+std::size_t FindByte(std::span<const unsigned char> oBytes, std::size_t nFirst,
+                     unsigned char nValue)
+{
+    if (nFirst == oBytes.size())
+    {
+        return nFirst;
+    }
+    const void* pFound = std::memchr(&oBytes[nFirst], nValue, oBytes.size() - nFirst);
+    return pFound == nullptr ? oBytes.size()
+                             : static_cast<std::size_t>(static_cast<const unsigned char*>(pFound) -
+                                                        oBytes.data());
 }
 
 }  // namespace kor::filters

@@ -16,18 +16,23 @@ namespace kor::filters
 void FindComputedPixels(const tessel::Mask* poMaskIn, const tessel::Mask* poMaskOut, std::int64_t x,
                         std::int64_t y, std::span<unsigned char> oComputed);
 
+/// Position of the first byte from nFirst on that is nValue, or the number of bytes.
+std::size_t FindByte(std::span<const unsigned char> oBytes, std::size_t nFirst,
+                     unsigned char nValue);
+
 /// Writes the background over a row of pixels of nChannels samples where oComputed is 0: zeros, or
 /// with bBGZero false the samples of pIn, converted.
 template <class TIn, class TOut>
 void WriteBackground(std::span<const unsigned char> oComputed, const TIn* pIn,
                      std::size_t nChannels, bool bBGZero, TOut* pOut)
 {
-    auto itFirst = std::find(oComputed.begin(), oComputed.end(), 0);
-    while (itFirst != oComputed.end())
+    std::size_t nEnd = 0;
+    for (std::size_t x = FindByte(oComputed, 0, 0); x < oComputed.size();
+         x = FindByte(oComputed, nEnd, 0))
     {
-        const auto itEnd = std::find(itFirst, oComputed.end(), 1);
-        const auto nStart = static_cast<std::size_t>(itFirst - oComputed.begin()) * nChannels;
-        const auto nCount = static_cast<std::size_t>(itEnd - itFirst) * nChannels;
+        nEnd = FindByte(oComputed, x, 1);
+        const std::size_t nStart = x * nChannels;
+        const std::size_t nCount = (nEnd - x) * nChannels;
         if (bBGZero)
         {
             std::fill_n(pOut + nStart, nCount, TOut(0));
@@ -36,7 +41,6 @@ void WriteBackground(std::span<const unsigned char> oComputed, const TIn* pIn,
         {
             ConvertSamples<TIn, TOut>(pIn + nStart, pOut + nStart, nCount);
         }
-        itFirst = std::find(itEnd, oComputed.end(), 0);
     }
 }
 

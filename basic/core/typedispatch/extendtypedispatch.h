@@ -57,15 +57,16 @@ public:
     static Interface* Dispatch(const std::vector<tessel::DataType>& oTypes, bool bExtendComplex)
     {
         static_assert(N >= 1);
+        const char* const pszFunction = __PRETTY_FUNCTION__;
         if (oTypes.size() < static_cast<std::size_t>(N))
         {
             constexpr bool bLastOfList =
                 std::is_same_v<typename ListA::Tail, typeconv::priv::NullDataType>;
             throw Exception("Not enough type in the vector for the dispatcher you are using.",
-                            kSource, __PRETTY_FUNCTION__, bLastOfList ? 163 : 114);
+                            kSource, pszFunction, bLastOfList ? 163 : 114);
         }
-        const auto oNone = []() -> Interface*
-        { throw Exception("Invalid type requested.", kSource, __PRETTY_FUNCTION__, 175); };
+        const auto oNone = [pszFunction]() -> Interface*
+        { throw Exception("Invalid type requested.", kSource, pszFunction, 175); };
         const auto oVisit = [&]<class T>() -> Interface*
         {
             using Fixed = typeconv::priv::TypeList<T, Chosen>;

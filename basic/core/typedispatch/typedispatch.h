@@ -23,12 +23,12 @@ public:
 
     static Product Dispatch(const tessel::DataType& oOut)
     {
+        const char* const pszFunction = __PRETTY_FUNCTION__;
         return VisitType<ListOut>(
             FindDataType<ListOut>(oOut, true),
             []<class TOut>() -> Product { return Policy::template Create<TIn, TOut>(); },
-            []() -> Product {
-                throw Exception("Invalid type to dispatch.", kTypeDispatchSource,
-                                __PRETTY_FUNCTION__, 375);
+            [pszFunction]() -> Product {
+                throw Exception("Invalid type to dispatch.", kTypeDispatchSource, pszFunction, 375);
             });
     }
 };
@@ -43,13 +43,13 @@ public:
 
     static Product Dispatch(const tessel::DataType& oIn, const tessel::DataType& oOut)
     {
+        const char* const pszFunction = __PRETTY_FUNCTION__;
         return VisitType<ListIn>(
             FindDataType<ListIn>(oIn, true),
             [&oOut]<class TIn>() -> Product
             { return OutputDispatchType<TIn, ListOut, Policy>::Dispatch(oOut); },
-            []() -> Product {
-                throw Exception("Invalid type to dispatch.", kTypeDispatchSource,
-                                __PRETTY_FUNCTION__, 443);
+            [pszFunction]() -> Product {
+                throw Exception("Invalid type to dispatch.", kTypeDispatchSource, pszFunction, 443);
             });
     }
 };
@@ -89,8 +89,7 @@ public:
 
         explicit FirstDataTypeHolder(const tessel::DataType& oOut)
             : mpoSecond(VisitType<NativeTypeList>(
-                  NativeCode(oOut),
-                  []<class T2>() -> IConvertTo* { return new Op<T1, T2>(); },
+                  NativeCode(oOut), []<class T2>() -> IConvertTo* { return new Op<T1, T2>(); },
                   []() -> IConvertTo* { return nullptr; }))
         {
         }

@@ -1,10 +1,12 @@
 #include "basic/tessel/mask/mask.h"
 
 #include <algorithm>
+#include <bit>
 #include <cstring>
 #include <limits>
 #include <memory>
 #include <string>
+#include <utility>
 
 #include "platform/exception/exception.h"
 
@@ -30,6 +32,23 @@ constexpr std::array<unsigned char, 2048> MakeBitTable()
         }
     }
     return anTable;
+}
+
+/// Eight bytes as eight bits, 1 where the byte is not 0, the first one in the most significant bit.
+unsigned char PackGroup(const unsigned char* pBytes)
+{
+    constexpr std::uint64_t kLowSeven = 0x7F7F7F7F7F7F7F7FU;
+    std::uint64_t nBytes = 0;
+    std::memcpy(&nBytes, pBytes, 8);
+    if constexpr (std::endian::native == std::endian::big)
+    {
+        nBytes = __builtin_bswap64(nBytes);
+    }
+    // The sum carries into the top bit of a byte with any low bit; the top bit itself is added by
+    // or.
+    const std::uint64_t nTopBits = (((nBytes & kLowSeven) + kLowSeven) | nBytes) & ~kLowSeven;
+    // Each of the factor's bits moves one byte's bit to its place in the highest byte.
+    return static_cast<unsigned char>(((nTopBits >> 7) * 0x8040201008040201U) >> 56);
 }
 
 }  // namespace
@@ -75,18 +94,44 @@ Mask::Mask(const RasterInfo& oInfo, const RasterContext& oContext, unsigned char
     }
 }
 
+Mask::Mask(Mask&& oOther) noexcept
+    : RasterInfo(std::exchange<RasterInfo>(oOther, RasterInfo(0, 0, 1, eDT_BIT))),
+      RasterContext(std::exchange<RasterContext>(oOther, RasterContext())),
+      mnTotalWidth(std::exchange(oOther.mnTotalWidth, 0)),
+      mnTotalHeight(std::exchange(oOther.mnTotalHeight, 0)),
+      moBits(std::exchange(oOther.moBits, {})),
+      mnBitCount(std::exchange(oOther.mnBitCount, 0)),
+      mnByteCount(std::exchange(oOther.mnByteCount, 0))
+{
+}
+
+Mask& Mask::operator=(Mask&& oOther) noexcept
+{
+    if (this != &oOther)
+    {
+        RasterInfo::operator=(std::exchange<RasterInfo>(oOther, RasterInfo(0, 0, 1, eDT_BIT)));
+        RasterContext::operator=(std::exchange<RasterContext>(oOther, RasterContext()));
+        mnTotalWidth = std::exchange(oOther.mnTotalWidth, 0);
+        mnTotalHeight = std::exchange(oOther.mnTotalHeight, 0);
+        moBits = std::exchange(oOther.moBits, {});
+        mnBitCount = std::exchange(oOther.mnBitCount, 0);
+        mnByteCount = std::exchange(oOther.mnByteCount, 0);
+    }
+    return *this;
+}
+
 void Mask::PackBytes(const unsigned char* pBytes)
 {
-    for (std::uint32_t nByte = 0; nByte < mnByteCount; ++nByte)
+    const std::uint32_t nWholeBytes = mnBitCount >> 3;
+    for (std::uint32_t nByte = 0; nByte < nWholeBytes; ++nByte)
     {
-        const unsigned char* pGroup = pBytes + std::size_t{nByte} * 8;
-        const std::uint32_t nPixels = std::min<std::uint32_t>(8, mnBitCount - nByte * 8);
-        unsigned int nPacked = 0;
-        for (std::uint32_t k = 0; k < nPixels; ++k)
-        {
-            nPacked |= (pGroup[k] != 0 ? 128U : 0U) >> k;
-        }
-        moBits[nByte] = static_cast<unsigned char>(nPacked);
+        moBits[nByte] = PackGroup(pBytes + std::size_t{nByte} * 8);
+    }
+    if (nWholeBytes < mnByteCount)
+    {
+        std::array<unsigned char, 8> anLast{};
+        std::copy_n(pBytes + std::size_t{nWholeBytes} * 8, mnBitCount & 7U, anLast.begin());
+        moBits.back() = PackGroup(anLast.data());
     }
 }
 
@@ -102,7 +147,8 @@ void Mask::RetrieveRaster(Raster* poRaster) const
     {
         // A raster of another extent than told keeps its own bounds, and finds 0 behind the mask.
         const std::uint64_t nPixels =
-            std::uint64_t{poRaster->mnTotalHeight} * poRaster->mnTotalWidth;
+            std::min(std::uint64_t{poRaster->mnTotalHeight} * poRaster->mnTotalWidth,
+                     poRaster->mnBufferSize);
         const std::uint64_t nKnown = std::min<std::uint64_t>(nPixels, mnBitCount);
         ExpandBits(0, {poRaster->mpBuffer, nKnown});
         std::fill(poRaster->mpBuffer + nKnown, poRaster->mpBuffer + nPixels,

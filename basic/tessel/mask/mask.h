@@ -15,7 +15,8 @@ namespace kor::tessel
 /// gaps, the first pixel in the most significant bit. Bits behind the last pixel are 0.
 ///
 /// It describes itself as one channel of eDT_BIT, whatever the info it was made from says. Can be
-/// moved, not copied. Filters only read it, from any number of threads.
+/// moved, not copied; the mask moved from is empty. Filters only read it, from any number of
+/// threads.
 class Mask : public RasterInfo, public RasterContext
 {
 public:
@@ -24,8 +25,8 @@ public:
     /// pBuffer is null or the mask would hold 2^32 pixels or more.
     Mask(const RasterInfo& oInfo, const RasterContext& oContext, unsigned char* pBuffer,
          bool bDeleteBuffer, bool bPacked);
-    Mask(Mask&&) noexcept = default;
-    Mask& operator=(Mask&&) noexcept = default;
+    Mask(Mask&& oOther) noexcept;
+    Mask& operator=(Mask&& oOther) noexcept;
     ~Mask() override = default;
 
     /// Fills a raster of the same total extent, margins included: an eDT_BIT one with the packed

@@ -103,10 +103,10 @@ Raster::Raster(const RasterInfo& oInfo, const RasterContext& oContext, unsigned 
 }
 
 Raster::Raster(Raster&& oOther) noexcept
-    : RasterInfo(oOther),
-      RasterContext(oOther),
-      mnTotalWidth(oOther.mnTotalWidth),
-      mnTotalHeight(oOther.mnTotalHeight),
+    : RasterInfo(std::exchange<RasterInfo>(oOther, RasterInfo())),
+      RasterContext(std::exchange<RasterContext>(oOther, RasterContext())),
+      mnTotalWidth(std::exchange(oOther.mnTotalWidth, 0)),
+      mnTotalHeight(std::exchange(oOther.mnTotalHeight, 0)),
       mpBuffer(std::exchange(oOther.mpBuffer, nullptr)),
       mnBufferSize(std::exchange(oOther.mnBufferSize, 0)),
       mbOwnsBuffer(std::exchange(oOther.mbOwnsBuffer, false))
@@ -118,10 +118,10 @@ Raster& Raster::operator=(Raster&& oOther) noexcept
     if (this != &oOther)
     {
         Release();
-        RasterInfo::operator=(oOther);
-        RasterContext::operator=(oOther);
-        mnTotalWidth = oOther.mnTotalWidth;
-        mnTotalHeight = oOther.mnTotalHeight;
+        RasterInfo::operator=(std::exchange<RasterInfo>(oOther, RasterInfo()));
+        RasterContext::operator=(std::exchange<RasterContext>(oOther, RasterContext()));
+        mnTotalWidth = std::exchange(oOther.mnTotalWidth, 0);
+        mnTotalHeight = std::exchange(oOther.mnTotalHeight, 0);
         mpBuffer = std::exchange(oOther.mpBuffer, nullptr);
         mnBufferSize = std::exchange(oOther.mnBufferSize, 0);
         mbOwnsBuffer = std::exchange(oOther.mbOwnsBuffer, false);

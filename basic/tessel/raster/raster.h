@@ -49,8 +49,9 @@ RasterInfo PartsAsChannels(const RasterInfo& oInfo);
 /// without gaps, the channels of a pixel side by side, the real part of a complex sample before the
 /// imaginary one. Filters compute addresses from the public fields; nothing checks coordinates.
 ///
-/// Can be moved, not copied; a second raster over the same bytes is made with the wrapping
-/// constructor. Reading one raster from several threads is safe, as is writing distinct rows.
+/// Can be moved, not copied; the raster moved from is empty. A second raster over the same bytes is
+/// made with the wrapping constructor. Reading one raster from several threads is safe, as is
+/// writing distinct rows.
 class Raster : public RasterInfo, public RasterContext
 {
 public:
