@@ -51,4 +51,9 @@ void AuxiliaryData::SetChannelNoData(std::optional<double> dfNoData, unsigned in
     EntryOf(nChannel).mdfNoData = dfNoData;
 }
 
+void AuxiliaryData::SetChannel(const Channel& oChannel, unsigned int nChannel)
+{
+    EntryOf(nChannel) = oChannel;
+}
+
 }  // namespace kor::datasources

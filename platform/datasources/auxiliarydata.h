@@ -44,6 +44,8 @@ public:
 
     /// All entries by channel number.
     const std::map<unsigned int, Channel>& GetChannels() const { return moChannels; }
+    /// Replaces a whole entry.
+    void SetChannel(const Channel& oChannel, unsigned int nChannel);
 
     bool operator==(const AuxiliaryData&) const = default;
 

@@ -26,6 +26,9 @@ public:
 
     /// The type that all channels have. Throws kor::DataException when they differ.
     tessel::DataType GetCommonType() const;
+    /// Fills a block of these channels, which all have oType. Errors as of
+    /// IRasterAccess::ReadRaster.
+    void ReadRaster(tessel::Raster* poRaster, const tessel::DataType& oType, int nEdgeMode) const;
     /// The dataset's data for these channels, numbered by their place in the list.
     AuxiliaryData GetAuxiliaryData() const;
     void SetAuxiliaryData(const AuxiliaryData& oData);

@@ -14,9 +14,8 @@ GeocodingInfo::GeocodingInfo(const Transform& oTransform) : moTransform(oTransfo
 
 void GeocodingInfo::RasterToMap(double dfCol, double dfRow, double& dfX, double& dfY) const
 {
-    const double dfXHere = GetXOffset() + dfCol * GetXPerCol() + dfRow * GetXPerRow();
+    dfX = GetXOffset() + dfCol * GetXPerCol() + dfRow * GetXPerRow();
     dfY = GetYOffset() + dfCol * GetYPerCol() + dfRow * GetYPerRow();
-    dfX = dfXHere;
 }
 
 void GeocodingInfo::MapToRaster(double dfX, double dfY, double& dfCol, double& dfRow) const

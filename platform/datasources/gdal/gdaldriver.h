@@ -17,8 +17,8 @@ namespace kor::datasources
 ///
 /// Made are files of the formats of these that can be written block by block: GTiff, ENVI, EHdr,
 /// HFA. The file comes into being with CreateChannels, which has to be called before anything else
-/// is set; a second call adds channels only where the format can do that, which none of these four
-/// can. All channels of a file have one type. eDT_BIT, eDT_C16U and eDT_C32U do not exist in GDAL
+/// is set, and once: channels cannot be added to a file that is there. All channels of a file have
+/// one type. eDT_BIT, eDT_C16U and eDT_C32U do not exist in GDAL
 /// and are refused, as is a type that the format does not have. A dataset that is destroyed before
 /// CreateChannels leaves no file.
 ///

@@ -1,0 +1,48 @@
+#pragma once
+
+#include <gdal.h>
+
+#include <memory>
+#include <vector>
+
+#include "platform/datasources/gdal/gdalfile.h"
+#include "platform/datasources/ichannelio.h"
+
+namespace kor::datasources
+{
+
+/// What is known of a file's channels since it was opened. A handle opened later is held against
+/// it: the file may have been replaced.
+struct GdalLayout
+{
+    int mnWidth = 0;
+    int mnHeight = 0;
+    std::vector<GDALDataType> mveTypes;
+
+    bool operator==(const GdalLayout&) const = default;
+};
+
+GdalLayout LayoutOf(GDALDatasetH hDataset);
+
+/// Windows of a file's channels, in the bands' own types, so that GDAL converts nothing.
+class GdalChannelIO : public IChannelIO
+{
+public:
+    /// Throws kor::IOException when the file has another layout by now.
+    GdalChannelIO(std::shared_ptr<GdalFile> poFile, const GdalLayout& oLayout);
+
+    void Read(std::span<const unsigned int> oChannels, const PixelWindow& oWindow,
+              unsigned char* pSamples, const SampleStrides& oStrides) override;
+    void Write(std::span<const unsigned int> oChannels, const PixelWindow& oWindow,
+               const unsigned char* pSamples, const SampleStrides& oStrides) override;
+
+private:
+    bool Transfer(GDALDatasetH hDataset, GDALRWFlag eDirection,
+                  std::span<const unsigned int> oChannels, const PixelWindow& oWindow,
+                  unsigned char* pSamples, const SampleStrides& oStrides) const;
+
+    std::shared_ptr<GdalFile> mpoFile;
+    GdalLayout moLayout;
+};
+
+}  // namespace kor::datasources

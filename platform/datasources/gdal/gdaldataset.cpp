@@ -1,0 +1,227 @@
+#include "platform/datasources/gdal/gdaldataset.h"
+
+#include <fcntl.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cerrno>
+#include <filesystem>
+#include <system_error>
+
+#include "platform/datasources/datatypename.h"
+#include "platform/datasources/gdal/gdalauxiliary.h"
+#include "platform/datasources/gdal/gdaltypes.h"
+#include "platform/exception/exception.h"
+
+namespace kor::datasources
+{
+
+namespace
+{
+
+constexpr const char* kSource = "platform/datasources/gdal/gdaldataset";
+
+/// Larger tiles are refused: GDAL takes the memory for one at once, on the word of the file.
+constexpr std::uint64_t kLargestTileBytes = std::uint64_t{1} << 31;
+
+/// Makes the file, empty, if it does not exist.
+void TakeName(const std::string& oFile)
+{
+    const int nFile = open(oFile.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0666);
+    if (nFile < 0)
+    {
+        throw FileException(
+            oFile + ": cannot make the file: " + std::generic_category().message(errno), oFile,
+            kSource, __PRETTY_FUNCTION__, __LINE__);
+    }
+    close(nFile);
+}
+
+}  // namespace
+
+GdalDataset::GdalDataset(const std::string& oFile, bool bUpdate)
+    : moFile(oFile), mpoFile(GdalFile::Open(oFile, bUpdate))
+{
+    TakeLayout();
+}
+
+GdalDataset::GdalDataset(const std::string& oFile, const std::string& oFormat,
+                         const std::vector<std::string>& voOptions)
+    : moFile(oFile), moFormat(oFormat), mvoOptions(voOptions)
+{
+    TakeName(oFile);
+}
+
+GdalDataset::~GdalDataset()
+{
+    if (!mpoFile)
+    {
+        std::error_code oIgnored;
+        std::filesystem::remove(moFile, oIgnored);
+    }
+}
+
+void GdalDataset::TakeLayout()
+{
+    mpoFile->Do(
+        "cannot look at the channels",
+        [&](GDALDatasetH hDataset)
+        {
+            moLayout = LayoutOf(hDataset);
+            moGeocoding = ReadGeocoding(hDataset);
+            mvoTypes.clear();
+            for (int nBand = 1; nBand <= GDALGetRasterCount(hDataset); ++nBand)
+            {
+                mvoTypes.push_back(
+                    TypeOfBand(GDALGetRasterBand(hDataset, nBand)).value_or(tessel::DataType()));
+            }
+            int nTileWidth = 1;
+            int nTileHeight = 1;
+            if (!mvoTypes.empty())
+            {
+                GDALGetBlockSize(GDALGetRasterBand(hDataset, 1), &nTileWidth, &nTileHeight);
+            }
+            mnTileWidth = static_cast<unsigned int>(std::max(1, nTileWidth));
+            mnTileHeight = static_cast<unsigned int>(std::max(1, nTileHeight));
+            return true;
+        });
+    std::uint64_t nSampleBytes = 1;
+    for (const tessel::DataType& oType : mvoTypes)
+    {
+        nSampleBytes = std::max<std::uint64_t>(nSampleBytes, oType.GetSampleBytes());
+    }
+    if (std::uint64_t{mnTileWidth} * mnTileHeight > kLargestTileBytes / nSampleBytes)
+    {
+        throw FileException(moFile + ": the file has tiles of " + std::to_string(mnTileWidth) +
+                                " x " + std::to_string(mnTileHeight) +
+                                " pixels, more than 2 GiB each",
+                            moFile, kSource, __PRETTY_FUNCTION__, __LINE__);
+    }
+    mnTileWidth = std::min(mnTileWidth, GetWidth());
+    mnTileHeight = std::min(mnTileHeight, GetHeight());
+}
+
+void GdalDataset::RequireUpdate(const char* pszTask) const
+{
+    if (!mpoFile)
+    {
+        throw IOException(moFile + ": " + pszTask + ": the file has no channels yet", kSource,
+                          __PRETTY_FUNCTION__, __LINE__);
+    }
+    if (!mpoFile->IsUpdate())
+    {
+        throw IOException(moFile + ": " + pszTask + ": the file was opened for reading", kSource,
+                          __PRETTY_FUNCTION__, __LINE__);
+    }
+}
+
+tessel::DataType GdalDataset::GetChannelType(unsigned int nChannel) const
+{
+    if (nChannel == 0 || nChannel > mvoTypes.size())
+    {
+        throw IOException(moFile + ": there is no channel " + std::to_string(nChannel) +
+                              "; the file has " + std::to_string(mvoTypes.size()) +
+                              ", numbered from 1",
+                          kSource, __PRETTY_FUNCTION__, __LINE__);
+    }
+    return mvoTypes[nChannel - 1];
+}
+
+unsigned int GdalDataset::CreateChannels(const tessel::RasterInfo& oInfo)
+{
+    const unsigned int nFirst = GetChannelCount() + 1;
+    if (mpoFile)
+    {
+        RequireUpdate("cannot add channels");
+        AddChannels(oInfo);
+    }
+    else
+    {
+        mpoFile = GdalFile::Create(moFile, moFormat, mvoOptions, oInfo);
+    }
+    TakeLayout();
+    return nFirst;
+}
+
+void GdalDataset::AddChannels(const tessel::RasterInfo& oInfo)
+{
+    std::string oReason;
+    if (oInfo.mnWidth != GetWidth() || oInfo.mnHeight != GetHeight())
+    {
+        oReason = "channels of " + std::to_string(oInfo.mnWidth) + " x " +
+                  std::to_string(oInfo.mnHeight) + " pixels do not fit the image of " +
+                  std::to_string(GetWidth()) + " x " + std::to_string(GetHeight());
+    }
+    else if (oInfo.moDataType != mvoTypes.front())
+    {
+        oReason = "the format " + mpoFile->GetFormat() + " cannot hold channels of " +
+                  DataTypeName(oInfo.moDataType) + " beside channels of " +
+                  DataTypeName(mvoTypes.front());
+    }
+    else
+    {
+        oReason = "the format " + mpoFile->GetFormat() +
+                  " cannot add channels to a file; make all of them by one call";
+    }
+    throw DataException(moFile + ": " + oReason, kSource, __PRETTY_FUNCTION__, __LINE__);
+}
+
+std::unique_ptr<IChannelIO> GdalDataset::OpenChannels(bool bWrite)
+{
+    if (bWrite)
+    {
+        RequireUpdate("cannot write pixels");
+    }
+    // A second handle on a file that is being changed would see old pixels, so all share the one.
+    const bool bShared = mpoFile && mpoFile->IsUpdate();
+    return std::make_unique<GdalChannelIO>(bShared ? mpoFile : GdalFile::Open(moFile, false),
+                                           moLayout);
+}
+
+AuxiliaryData GdalDataset::GetAuxiliaryData() const
+{
+    AuxiliaryData oData;
+    if (mpoFile)
+    {
+        mpoFile->Do("cannot read the metadata",
+                    [&](GDALDatasetH hDataset)
+                    {
+                        oData = ReadAuxiliaryData(hDataset);
+                        return true;
+                    });
+    }
+    return oData;
+}
+
+void GdalDataset::SetAuxiliaryData(const AuxiliaryData& oData)
+{
+    RequireUpdate("cannot set the metadata");
+    for (const auto& [nChannel, oChannel] : oData.GetChannels())
+    {
+        GetChannelType(nChannel);  // throws when there is no such channel
+    }
+    mpoFile->Do("cannot set the metadata",
+                [&](GDALDatasetH hDataset) { return WriteAuxiliaryData(hDataset, oData, moFile); });
+}
+
+void GdalDataset::SetGeocodingInfo(const ogc::cs::GeocodingInfo& oInfo)
+{
+    RequireUpdate("cannot set the georeferencing");
+    mpoFile->Do("cannot set the georeferencing",
+                [&](GDALDatasetH hDataset)
+                {
+                    const bool bDone = WriteGeocoding(hDataset, oInfo);
+                    moGeocoding = ReadGeocoding(hDataset);
+                    return bDone;
+                });
+}
+
+void GdalDataset::Flush()
+{
+    if (mpoFile)
+    {
+        mpoFile->Flush();
+    }
+}
+
+}  // namespace kor::datasources

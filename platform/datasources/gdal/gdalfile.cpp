@@ -1,0 +1,270 @@
+#include "platform/datasources/gdal/gdalfile.h"
+
+#include <cpl_string.h>
+
+#include <cstring>
+#include <filesystem>
+#include <limits>
+#include <system_error>
+
+#include "platform/datasources/datatypename.h"
+#include "platform/datasources/gdal/gdalformats.h"
+#include "platform/datasources/gdal/gdaltypes.h"
+#include "platform/exception/exception.h"
+#include "platform/fileio/file.h"
+
+namespace kor::datasources
+{
+
+namespace
+{
+
+constexpr const char* kSource = "platform/datasources/gdal/gdalfile";
+constexpr unsigned int kMostChannels = 65535;
+
+[[noreturn]] void ThrowData(const std::string& oFile, const std::string& oText,
+                            const std::string& oFunction, unsigned int nLine)
+{
+    throw DataException(oFile + ": " + oText, kSource, oFunction, nLine);
+}
+
+OwnedGdalDataset OpenHandle(const std::string& oFile, bool bUpdate,
+                            const std::vector<std::string>& voFormats)
+{
+    const CPLStringList oFormats = StringListOf(voFormats);
+    const auto nFlags = static_cast<unsigned int>(GDAL_OF_RASTER | GDAL_OF_VERBOSE_ERROR |
+                                                  (bUpdate ? GDAL_OF_UPDATE : GDAL_OF_READONLY));
+    return OwnedGdalDataset(
+        GDALOpenEx(GdalName(oFile).c_str(), nFlags, oFormats.List(), nullptr, nullptr));
+}
+
+/// Files that a format writes beside the one it is told to: an older one would be lost.
+std::vector<std::string> CompanionsOf(const std::string& oFile, const std::string& oFormat,
+                                      const std::vector<std::string>& voOptions)
+{
+    std::vector<std::string> voEndings;
+    if (oFormat == "ENVI")
+    {
+        voEndings = {"hdr"};
+    }
+    if (oFormat == "EHdr")
+    {
+        voEndings = {"hdr", "prj", "stx", "clr"};
+    }
+    if (oFormat == "HFA")
+    {
+        voEndings = {"ige", "rrd"};
+    }
+    if (oFormat == "GTiff")
+    {
+        for (const std::string& oOption : voOptions)
+        {
+            if (oOption.starts_with("TFW=") || oOption.starts_with("WORLDFILE="))
+            {
+                voEndings = {"tfw", "wld"};
+            }
+        }
+    }
+    std::vector<std::string> voCompanions;
+    for (const std::string& oEnding : voEndings)
+    {
+        voCompanions.push_back(std::filesystem::path(oFile).replace_extension(oEnding).string());
+        voCompanions.push_back(oFile + "." + oEnding);
+    }
+    return voCompanions;
+}
+
+/// True when a driver's list of words, parted by blanks, has this one.
+bool HasWord(const char* pszWords, const char* pszWord)
+{
+    const CPLStringList oWords(CSLTokenizeString2(pszWords == nullptr ? "" : pszWords, " ", 0));
+    return oWords.FindString(pszWord) >= 0;
+}
+
+bool CanHold(GDALDriverH hDriver, const tessel::DataType& oType)
+{
+    const GDALDataType eGdal = GdalTypeOf(oType);
+    if (eGdal == GDT_Unknown)
+    {
+        return false;
+    }
+    if (NeedsSignedByteOption(oType))
+    {
+        const char* pszOptions = GDALGetMetadataItem(hDriver, GDAL_DMD_CREATIONOPTIONLIST, nullptr);
+        if (pszOptions == nullptr || std::strstr(pszOptions, "'PIXELTYPE'") == nullptr)
+        {
+            return false;
+        }
+    }
+    return HasWord(GDALGetMetadataItem(hDriver, GDAL_DMD_CREATIONDATATYPES, nullptr),
+                   GDALGetDataTypeName(eGdal));
+}
+
+/// What can be told before the file is made.
+void RequireCreatable(const std::string& oFile, GDALDriverH hDriver,
+                      const std::vector<std::string>& voCompanions, const tessel::RasterInfo& oInfo)
+{
+    constexpr std::uint32_t kLargestSide = std::numeric_limits<int>::max();
+    if (oInfo.mnWidth == 0 || oInfo.mnHeight == 0 || oInfo.mnWidth > kLargestSide ||
+        oInfo.mnHeight > kLargestSide)
+    {
+        ThrowData(oFile,
+                  "an image of " + std::to_string(oInfo.mnWidth) + " x " +
+                      std::to_string(oInfo.mnHeight) + " pixels cannot be made",
+                  __PRETTY_FUNCTION__, __LINE__);
+    }
+    if (oInfo.mnChannels == 0 || oInfo.mnChannels > kMostChannels)
+    {
+        ThrowData(oFile,
+                  std::to_string(oInfo.mnChannels) + " channels cannot be made; 1 to " +
+                      std::to_string(kMostChannels) + " can",
+                  __PRETTY_FUNCTION__, __LINE__);
+    }
+    if (!CanHold(hDriver, oInfo.moDataType))
+    {
+        ThrowData(oFile,
+                  std::string("the format ") + GDALGetDriverShortName(hDriver) +
+                      " cannot hold samples of " + DataTypeName(oInfo.moDataType),
+                  __PRETTY_FUNCTION__, __LINE__);
+    }
+    for (const std::string& oCompanion : voCompanions)
+    {
+        if (core::fileio::File::Exists(oCompanion))
+        {
+            throw FileException(oFile + ": the file " + oCompanion +
+                                    ", which belongs to it, exists already and is not overwritten",
+                                oCompanion, kSource, __PRETTY_FUNCTION__, __LINE__);
+        }
+    }
+}
+
+/// Empty when all bands have the type that was asked for; an option may have changed it.
+std::string UnexpectedType(GDALDatasetH hDataset, const tessel::DataType& oType)
+{
+    for (int nBand = 1; nBand <= GDALGetRasterCount(hDataset); ++nBand)
+    {
+        const auto oMade = TypeOfBand(GDALGetRasterBand(hDataset, nBand));
+        if (!oMade || *oMade != oType)
+        {
+            return "the options make channels of " +
+                   (oMade ? DataTypeName(*oMade) : std::string("an unknown type")) +
+                   " out of channels of " + DataTypeName(oType);
+        }
+    }
+    return std::string();
+}
+
+void RemoveFiles(const std::string& oFile, const std::vector<std::string>& voCompanions)
+{
+    std::error_code oIgnored;
+    std::filesystem::remove(oFile, oIgnored);
+    for (const std::string& oCompanion : voCompanions)
+    {
+        std::filesystem::remove(oCompanion, oIgnored);
+    }
+}
+
+}  // namespace
+
+void CloseGdalDataset::operator()(void* hDataset) const
+{
+    const GdalErrors oErrors;
+    GDALClose(hDataset);
+}
+
+GdalFile::GdalFile(OwnedGdalDataset poDataset, const std::string& oFile, bool bUpdate)
+    : mpoDataset(std::move(poDataset)),
+      moFile(oFile),
+      moFormat(GDALGetDriverShortName(GDALGetDatasetDriver(mpoDataset.get()))),
+      mbUpdate(bUpdate)
+{
+}
+
+std::shared_ptr<GdalFile> GdalFile::Open(const std::string& oFile, bool bUpdate)
+{
+    const GdalErrors oErrors;
+    OwnedGdalDataset poDataset = OpenHandle(oFile, bUpdate, AllowedFormats());
+    if (!poDataset)
+    {
+        throw FileException(oFile + ": cannot open the file" + (bUpdate ? " for changing" : "") +
+                                ": " + oErrors.GetText(),
+                            oFile, kSource, __PRETTY_FUNCTION__, __LINE__);
+    }
+    return std::shared_ptr<GdalFile>(new GdalFile(std::move(poDataset), oFile, bUpdate));
+}
+
+std::shared_ptr<GdalFile> GdalFile::Create(const std::string& oFile, const std::string& oFormat,
+                                           const std::vector<std::string>& voOptions,
+                                           const tessel::RasterInfo& oInfo)
+{
+    const GdalErrors oErrors;
+    GDALDriverH hDriver = GDALGetDriverByName(oFormat.c_str());
+    const auto voCompanions = CompanionsOf(oFile, oFormat, voOptions);
+    RequireCreatable(oFile, hDriver, voCompanions, oInfo);
+    CPLStringList oOptions = StringListOf(voOptions);
+    if (NeedsSignedByteOption(oInfo.moDataType))
+    {
+        oOptions.SetNameValue("PIXELTYPE", "SIGNEDBYTE");
+    }
+    OwnedGdalDataset poDataset(
+        GDALCreate(hDriver, GdalName(oFile).c_str(), static_cast<int>(oInfo.mnWidth),
+                   static_cast<int>(oInfo.mnHeight), static_cast<int>(oInfo.mnChannels),
+                   GdalTypeOf(oInfo.moDataType), oOptions.List()));
+    if (!poDataset)
+    {
+        RemoveFiles(oFile, voCompanions);
+        throw FileException(oFile + ": cannot make the file: " + oErrors.GetText(), oFile, kSource,
+                            __PRETTY_FUNCTION__, __LINE__);
+    }
+    const std::string oUnexpected = UnexpectedType(poDataset.get(), oInfo.moDataType);
+    if (!oUnexpected.empty())
+    {
+        poDataset.reset();
+        RemoveFiles(oFile, voCompanions);
+        ThrowData(oFile, oUnexpected, __PRETTY_FUNCTION__, __LINE__);
+    }
+    return std::shared_ptr<GdalFile>(new GdalFile(std::move(poDataset), oFile, true));
+}
+
+void GdalFile::Throw(const std::string& oTask, const GdalErrors& oErrors) const
+{
+    throw IOException(moFile + ": " + oTask + ": " + oErrors.GetText(), kSource,
+                      __PRETTY_FUNCTION__, __LINE__);
+}
+
+void GdalFile::Do(const std::string& oTask, const std::function<bool(GDALDatasetH)>& oAction)
+{
+    const std::lock_guard oLock(moMutex);
+    const GdalErrors oErrors;
+    if (!mpoDataset)
+    {
+        mpoDataset = OpenHandle(moFile, mbUpdate, {moFormat});
+        if (!mpoDataset)
+        {
+            Throw("cannot open the file anew", oErrors);
+        }
+    }
+    if (!oAction(mpoDataset.get()) || oErrors.Failed())
+    {
+        Throw(oTask, oErrors);
+    }
+}
+
+void GdalFile::Flush()
+{
+    const std::lock_guard oLock(moMutex);
+    if (!mpoDataset || !mbUpdate)
+    {
+        return;
+    }
+    const GdalErrors oErrors;
+    GDALFlushCache(mpoDataset.get());
+    // Not reset(): its deleter would keep the errors of closing for itself.
+    GDALClose(mpoDataset.release());
+    if (oErrors.Failed())
+    {
+        Throw("cannot write the file", oErrors);
+    }
+}
+
+}  // namespace kor::datasources
