@@ -1,47 +1,31 @@
 #include "processes/qrdfilters/background.h"
 
-#include <algorithm>
 #include <array>
 #include <cstring>
+#include <functional>
 
 namespace kor::filters
 {
 
-namespace
-{
-
-/// Clears the pixels of the row that poMask masks.
-void ClearClipped(const tessel::Mask& oMask, std::int64_t x, std::int64_t y,
-                  std::span<unsigned char> oComputed)
-{
-    std::array<unsigned char, 256> anValid{};
-    for (std::size_t nFirst = 0; nFirst < oComputed.size(); nFirst += anValid.size())
-    {
-        const auto oPart =
-            oComputed.subspan(nFirst, std::min(anValid.size(), oComputed.size() - nFirst));
-        oMask.ExpandRow(x + static_cast<std::int64_t>(nFirst), y, {anValid.data(), oPart.size()});
-        for (std::size_t i = 0; i < oPart.size(); ++i)
-        {
-            oPart[i] &= anValid[i];
-        }
-    }
-}
-
-}  // namespace
-
 void FindComputedPixels(const tessel::Mask* poMaskIn, const tessel::Mask* poMaskOut, std::int64_t x,
                         std::int64_t y, std::span<unsigned char> oComputed)
 {
-    const tessel::Mask* poFirst = poMaskIn != nullptr ? poMaskIn : poMaskOut;
-    if (poFirst == nullptr)
+    if (poMaskIn == nullptr && poMaskOut == nullptr)
     {
         std::fill(oComputed.begin(), oComputed.end(), static_cast<unsigned char>(1));
         return;
     }
-    poFirst->ExpandRow(x, y, oComputed);
-    if (poMaskIn != nullptr && poMaskOut != nullptr)
+    (poMaskIn != nullptr ? poMaskIn : poMaskOut)->ExpandRow(x, y, oComputed);
+    if (poMaskIn == nullptr || poMaskOut == nullptr)
     {
-        ClearClipped(*poMaskOut, x, y, oComputed);
+        return;
+    }
+    std::array<unsigned char, 512> anOut{};
+    for (std::size_t i = 0; i < oComputed.size(); i += anOut.size())
+    {
+        const auto oPart = oComputed.subspan(i, std::min(anOut.size(), oComputed.size() - i));
+        poMaskOut->ExpandRow(x + static_cast<std::int64_t>(i), y, {anOut.data(), oPart.size()});
+        std::transform(oPart.begin(), oPart.end(), anOut.begin(), oPart.begin(), std::bit_and<>());
     }
 }
 
