@@ -1,6 +1,7 @@
 #include "platform/datasources/gdal/gdaldataset.h"
 
 #include <fcntl.h>
+#include <gdal_priv.h>
 #include <unistd.h>
 
 #include <algorithm>
@@ -37,12 +38,31 @@ void TakeName(const std::string& oFile)
     close(nFile);
 }
 
+/// Bytes that a file of plain samples has to have by what its header says; 0 for other files. Some
+/// drivers read zeros behind the end of such a file without an error.
+std::uint64_t NeededBytes(GDALDatasetH hDataset, const GdalLayout& oLayout, std::string& oRawFile)
+{
+    GDALDataset::RawBinaryLayout oRaw;
+    if (oLayout.mveTypes.empty() || !GDALDataset::FromHandle(hDataset)->GetRawBinaryLayout(oRaw))
+    {
+        return 0;
+    }
+    oRawFile = oRaw.osRawFilename;
+    const auto oSpan = [](GIntBig nStep, std::size_t nCount)
+    { return static_cast<std::uint64_t>(std::max<GIntBig>(nStep, 0)) * (nCount - 1); };
+    return oRaw.nImageOffset + oSpan(oRaw.nLineOffset, static_cast<std::size_t>(oLayout.mnHeight)) +
+           oSpan(oRaw.nPixelOffset, static_cast<std::size_t>(oLayout.mnWidth)) +
+           oSpan(oRaw.nBandOffset, oLayout.mveTypes.size()) +
+           static_cast<std::uint64_t>(GDALGetDataTypeSizeBytes(oRaw.eDataType));
+}
+
 }  // namespace
 
 GdalDataset::GdalDataset(const std::string& oFile, bool bUpdate)
     : moFile(oFile), mpoFile(GdalFile::Open(oFile, bUpdate))
 {
     TakeLayout();
+    RequireWholeFile();
 }
 
 GdalDataset::GdalDataset(const std::string& oFile, const std::string& oFormat,
@@ -99,6 +119,26 @@ void GdalDataset::TakeLayout()
     }
     mnTileWidth = std::min(mnTileWidth, GetWidth());
     mnTileHeight = std::min(mnTileHeight, GetHeight());
+}
+
+void GdalDataset::RequireWholeFile() const
+{
+    std::string oRawFile;
+    std::uint64_t nNeeded = 0;
+    mpoFile->Do("cannot look at the channels",
+                [&](GDALDatasetH hDataset)
+                {
+                    nNeeded = NeededBytes(hDataset, moLayout, oRawFile);
+                    return true;
+                });
+    std::error_code oError;
+    const std::uint64_t nBytes = std::filesystem::file_size(oRawFile, oError);
+    if (nNeeded != 0 && !oError && nBytes < nNeeded)
+    {
+        throw FileException(moFile + ": the file is cut off: it has " + std::to_string(nBytes) +
+                                " bytes and its header tells of " + std::to_string(nNeeded),
+                            moFile, kSource, __PRETTY_FUNCTION__, __LINE__);
+    }
 }
 
 void GdalDataset::RequireUpdate(const char* pszTask) const

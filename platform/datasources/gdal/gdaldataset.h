@@ -44,6 +44,7 @@ public:
 
 private:
     void TakeLayout();
+    void RequireWholeFile() const;
     void RequireUpdate(const char* pszTask) const;
     void AddChannels(const tessel::RasterInfo& oInfo);
 

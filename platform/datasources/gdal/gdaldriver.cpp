@@ -51,6 +51,8 @@ public:
 
     std::unique_ptr<IDataset> Create(const std::string& oFile, const std::string& oFormat,
                                      const std::string& oOptions) const override;
+
+    bool AllowFormat(const std::string& oFormat) override { return AllowGdalFormat(oFormat); }
 };
 
 std::vector<std::string> SplitOptions(const std::string& oFile, const std::string& oOptions)
@@ -87,8 +89,7 @@ std::unique_ptr<IDataset> GdalDriver::Create(const std::string& oFile, const std
         throw DataException(oFile + ": " + oErrors.GetText(), kSource, __PRETTY_FUNCTION__,
                             __LINE__);
     }
-    return std::make_unique<GdalDataset>(oFile, GDALGetDriverShortName(hDriver),
-                                         voOptions);
+    return std::make_unique<GdalDataset>(oFile, GDALGetDriverShortName(hDriver), voOptions);
 }
 
 }  // namespace

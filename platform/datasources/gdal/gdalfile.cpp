@@ -74,30 +74,30 @@ std::vector<std::string> CompanionsOf(const std::string& oFile, const std::strin
     return voCompanions;
 }
 
-/// True when a driver's list of words, parted by blanks, has this one.
-bool HasWord(const char* pszWords, const char* pszWord)
+/// False where the driver would make another type of it or has no way to say it. That a driver
+/// lists a type or not tells little: GTiff makes 64-bit integers without listing them.
+bool MayHold(GDALDriverH hDriver, const tessel::DataType& oType)
 {
-    const CPLStringList oWords(CSLTokenizeString2(pszWords == nullptr ? "" : pszWords, " ", 0));
-    return oWords.FindString(pszWord) >= 0;
+    if (!NeedsSignedByteOption(oType))
+    {
+        return GdalTypeOf(oType) != GDT_Unknown;
+    }
+    const char* pszOptions = GDALGetMetadataItem(hDriver, GDAL_DMD_CREATIONOPTIONLIST, nullptr);
+    return pszOptions != nullptr && std::strstr(pszOptions, "'PIXELTYPE'") != nullptr;
 }
 
-bool CanHold(GDALDriverH hDriver, const tessel::DataType& oType)
+/// True when the driver says that it makes files of this type.
+bool ListsType(GDALDriverH hDriver, const tessel::DataType& oType)
 {
-    const GDALDataType eGdal = GdalTypeOf(oType);
-    if (eGdal == GDT_Unknown)
-    {
-        return false;
-    }
-    if (NeedsSignedByteOption(oType))
-    {
-        const char* pszOptions = GDALGetMetadataItem(hDriver, GDAL_DMD_CREATIONOPTIONLIST, nullptr);
-        if (pszOptions == nullptr || std::strstr(pszOptions, "'PIXELTYPE'") == nullptr)
-        {
-            return false;
-        }
-    }
-    return HasWord(GDALGetMetadataItem(hDriver, GDAL_DMD_CREATIONDATATYPES, nullptr),
-                   GDALGetDataTypeName(eGdal));
+    const char* pszTypes = GDALGetMetadataItem(hDriver, GDAL_DMD_CREATIONDATATYPES, nullptr);
+    const CPLStringList oTypes(CSLTokenizeString2(pszTypes == nullptr ? "" : pszTypes, " ", 0));
+    return oTypes.FindString(GDALGetDataTypeName(GdalTypeOf(oType))) >= 0;
+}
+
+std::string CannotHold(GDALDriverH hDriver, const tessel::DataType& oType)
+{
+    return std::string("the format ") + GDALGetDriverShortName(hDriver) +
+           " cannot hold samples of " + DataTypeName(oType);
 }
 
 /// What can be told before the file is made.
@@ -120,12 +120,9 @@ void RequireCreatable(const std::string& oFile, GDALDriverH hDriver,
                       std::to_string(kMostChannels) + " can",
                   __PRETTY_FUNCTION__, __LINE__);
     }
-    if (!CanHold(hDriver, oInfo.moDataType))
+    if (!MayHold(hDriver, oInfo.moDataType))
     {
-        ThrowData(oFile,
-                  std::string("the format ") + GDALGetDriverShortName(hDriver) +
-                      " cannot hold samples of " + DataTypeName(oInfo.moDataType),
-                  __PRETTY_FUNCTION__, __LINE__);
+        ThrowData(oFile, CannotHold(hDriver, oInfo.moDataType), __PRETTY_FUNCTION__, __LINE__);
     }
     for (const std::string& oCompanion : voCompanions)
     {
@@ -154,10 +151,9 @@ std::string UnexpectedType(GDALDatasetH hDataset, const tessel::DataType& oType)
     return std::string();
 }
 
-void RemoveFiles(const std::string& oFile, const std::vector<std::string>& voCompanions)
+void RemoveFiles(const std::vector<std::string>& voCompanions)
 {
     std::error_code oIgnored;
-    std::filesystem::remove(oFile, oIgnored);
     for (const std::string& oCompanion : voCompanions)
     {
         std::filesystem::remove(oCompanion, oIgnored);
@@ -212,7 +208,12 @@ std::shared_ptr<GdalFile> GdalFile::Create(const std::string& oFile, const std::
                    GdalTypeOf(oInfo.moDataType), oOptions.List()));
     if (!poDataset)
     {
-        RemoveFiles(oFile, voCompanions);
+        RemoveFiles(voCompanions);
+        if (!ListsType(hDriver, oInfo.moDataType))
+        {
+            ThrowData(oFile, CannotHold(hDriver, oInfo.moDataType) + ": " + oErrors.GetText(),
+                      __PRETTY_FUNCTION__, __LINE__);
+        }
         throw FileException(oFile + ": cannot make the file: " + oErrors.GetText(), oFile, kSource,
                             __PRETTY_FUNCTION__, __LINE__);
     }
@@ -220,7 +221,7 @@ std::shared_ptr<GdalFile> GdalFile::Create(const std::string& oFile, const std::
     if (!oUnexpected.empty())
     {
         poDataset.reset();
-        RemoveFiles(oFile, voCompanions);
+        RemoveFiles(voCompanions);
         ThrowData(oFile, oUnexpected, __PRETTY_FUNCTION__, __LINE__);
     }
     return std::shared_ptr<GdalFile>(new GdalFile(std::move(poDataset), oFile, true));

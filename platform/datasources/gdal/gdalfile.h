@@ -28,9 +28,9 @@ class GdalFile
 public:
     /// Opens a file as one of the formats that are allowed. Throws kor::FileException.
     static std::shared_ptr<GdalFile> Open(const std::string& oFile, bool bUpdate);
-    /// Makes a file, over an empty one of that name if there is one, and takes it away again when
-    /// that fails. Throws kor::DataException when the format cannot hold such channels, else
-    /// kor::FileException.
+    /// Makes a file over an empty one of that name, which the caller has made to take the name and
+    /// takes away when this fails. Throws kor::DataException when the format cannot hold such
+    /// channels, else kor::FileException.
     static std::shared_ptr<GdalFile> Create(const std::string& oFile, const std::string& oFormat,
                                             const std::vector<std::string>& voOptions,
                                             const tessel::RasterInfo& oInfo);
