@@ -23,7 +23,7 @@ namespace
 constexpr const char* kSource = "platform/datasources/gdal/gdaldataset";
 
 /// Larger tiles are refused: GDAL takes the memory for one at once, on the word of the file.
-constexpr std::uint64_t kLargestTileBytes = std::uint64_t{1} << 31;
+constexpr std::int64_t kLargestTileBytes = std::int64_t{1} << 30;
 
 /// Makes the file, empty, if it does not exist.
 void TakeName(const std::string& oFile)
@@ -38,22 +38,48 @@ void TakeName(const std::string& oFile)
     close(nFile);
 }
 
-/// Bytes that a file of plain samples has to have by what its header says; 0 for other files. Some
-/// drivers read zeros behind the end of such a file without an error.
-std::uint64_t NeededBytes(GDALDatasetH hDataset, const GdalLayout& oLayout, std::string& oRawFile)
+void RequireSaneTiles(GDALDatasetH hDataset, const std::string& oFile)
+{
+    for (int nBand = 1; nBand <= GDALGetRasterCount(hDataset); ++nBand)
+    {
+        GDALRasterBandH hBand = GDALGetRasterBand(hDataset, nBand);
+        int nWidth = 0;
+        int nHeight = 0;
+        GDALGetBlockSize(hBand, &nWidth, &nHeight);
+        const std::int64_t nSampleBytes = GDALGetDataTypeSizeBytes(GDALGetRasterDataType(hBand));
+        if (nSampleBytes != 0 && std::int64_t{nWidth} * nHeight > kLargestTileBytes / nSampleBytes)
+        {
+            throw FileException(oFile + ": channel " + std::to_string(nBand) + " has tiles of " +
+                                    std::to_string(nWidth) + " x " + std::to_string(nHeight) +
+                                    " pixels, more than 1 GiB each",
+                                oFile, kSource, __PRETTY_FUNCTION__, __LINE__);
+        }
+    }
+}
+
+/// Some drivers read zeros behind the end of a file of plain samples without an error.
+void RequireWholeFile(GDALDatasetH hDataset, const GdalLayout& oLayout, const std::string& oFile)
 {
     GDALDataset::RawBinaryLayout oRaw;
     if (oLayout.mveTypes.empty() || !GDALDataset::FromHandle(hDataset)->GetRawBinaryLayout(oRaw))
     {
-        return 0;
+        return;
     }
-    oRawFile = oRaw.osRawFilename;
     const auto oSpan = [](GIntBig nStep, std::size_t nCount)
     { return static_cast<std::uint64_t>(std::max<GIntBig>(nStep, 0)) * (nCount - 1); };
-    return oRaw.nImageOffset + oSpan(oRaw.nLineOffset, static_cast<std::size_t>(oLayout.mnHeight)) +
-           oSpan(oRaw.nPixelOffset, static_cast<std::size_t>(oLayout.mnWidth)) +
-           oSpan(oRaw.nBandOffset, oLayout.mveTypes.size()) +
-           static_cast<std::uint64_t>(GDALGetDataTypeSizeBytes(oRaw.eDataType));
+    const std::uint64_t nNeeded =
+        oRaw.nImageOffset + oSpan(oRaw.nLineOffset, static_cast<std::size_t>(oLayout.mnHeight)) +
+        oSpan(oRaw.nPixelOffset, static_cast<std::size_t>(oLayout.mnWidth)) +
+        oSpan(oRaw.nBandOffset, oLayout.mveTypes.size()) +
+        static_cast<std::uint64_t>(GDALGetDataTypeSizeBytes(oRaw.eDataType));
+    std::error_code oError;
+    const std::uint64_t nBytes = std::filesystem::file_size(oRaw.osRawFilename, oError);
+    if (!oError && nBytes < nNeeded)
+    {
+        throw FileException(oFile + ": the file is cut off: it has " + std::to_string(nBytes) +
+                                " bytes and its header tells of " + std::to_string(nNeeded),
+                            oFile, kSource, __PRETTY_FUNCTION__, __LINE__);
+    }
 }
 
 }  // namespace
@@ -62,7 +88,13 @@ GdalDataset::GdalDataset(const std::string& oFile, bool bUpdate)
     : moFile(oFile), mpoFile(GdalFile::Open(oFile, bUpdate))
 {
     TakeLayout();
-    RequireWholeFile();
+    mpoFile->Do("cannot look at the channels",
+                [&](GDALDatasetH hDataset)
+                {
+                    RequireSaneTiles(hDataset, moFile);
+                    RequireWholeFile(hDataset, moLayout, moFile);
+                    return true;
+                });
 }
 
 GdalDataset::GdalDataset(const std::string& oFile, const std::string& oFormat,
@@ -105,40 +137,8 @@ void GdalDataset::TakeLayout()
             mnTileHeight = static_cast<unsigned int>(std::max(1, nTileHeight));
             return true;
         });
-    std::uint64_t nSampleBytes = 1;
-    for (const tessel::DataType& oType : mvoTypes)
-    {
-        nSampleBytes = std::max<std::uint64_t>(nSampleBytes, oType.GetSampleBytes());
-    }
-    if (std::uint64_t{mnTileWidth} * mnTileHeight > kLargestTileBytes / nSampleBytes)
-    {
-        throw FileException(moFile + ": the file has tiles of " + std::to_string(mnTileWidth) +
-                                " x " + std::to_string(mnTileHeight) +
-                                " pixels, more than 2 GiB each",
-                            moFile, kSource, __PRETTY_FUNCTION__, __LINE__);
-    }
     mnTileWidth = std::min(mnTileWidth, GetWidth());
     mnTileHeight = std::min(mnTileHeight, GetHeight());
-}
-
-void GdalDataset::RequireWholeFile() const
-{
-    std::string oRawFile;
-    std::uint64_t nNeeded = 0;
-    mpoFile->Do("cannot look at the channels",
-                [&](GDALDatasetH hDataset)
-                {
-                    nNeeded = NeededBytes(hDataset, moLayout, oRawFile);
-                    return true;
-                });
-    std::error_code oError;
-    const std::uint64_t nBytes = std::filesystem::file_size(oRawFile, oError);
-    if (nNeeded != 0 && !oError && nBytes < nNeeded)
-    {
-        throw FileException(moFile + ": the file is cut off: it has " + std::to_string(nBytes) +
-                                " bytes and its header tells of " + std::to_string(nNeeded),
-                            moFile, kSource, __PRETTY_FUNCTION__, __LINE__);
-    }
 }
 
 void GdalDataset::RequireUpdate(const char* pszTask) const
@@ -173,7 +173,7 @@ unsigned int GdalDataset::CreateChannels(const tessel::RasterInfo& oInfo)
     if (mpoFile)
     {
         RequireUpdate("cannot add channels");
-        AddChannels(oInfo);
+        RefuseMoreChannels(oInfo);
     }
     else
     {
@@ -183,7 +183,7 @@ unsigned int GdalDataset::CreateChannels(const tessel::RasterInfo& oInfo)
     return nFirst;
 }
 
-void GdalDataset::AddChannels(const tessel::RasterInfo& oInfo)
+void GdalDataset::RefuseMoreChannels(const tessel::RasterInfo& oInfo) const
 {
     std::string oReason;
     if (oInfo.mnWidth != GetWidth() || oInfo.mnHeight != GetHeight())

@@ -44,9 +44,8 @@ public:
 
 private:
     void TakeLayout();
-    void RequireWholeFile() const;
     void RequireUpdate(const char* pszTask) const;
-    void AddChannels(const tessel::RasterInfo& oInfo);
+    [[noreturn]] void RefuseMoreChannels(const tessel::RasterInfo& oInfo) const;
 
     std::string moFile;
     std::string moFormat;

@@ -135,17 +135,21 @@ void RequireCreatable(const std::string& oFile, GDALDriverH hDriver,
     }
 }
 
-/// Empty when all bands have the type that was asked for; an option may have changed it.
-std::string UnexpectedType(GDALDatasetH hDataset, const tessel::DataType& oType)
+/// Empty when all bands have the type that was asked for. An option may have changed it, and some
+/// drivers make bytes of a type that they do not know, without an error.
+std::string UnexpectedType(GDALDriverH hDriver, GDALDatasetH hDataset,
+                           const tessel::DataType& oType)
 {
     for (int nBand = 1; nBand <= GDALGetRasterCount(hDataset); ++nBand)
     {
         const auto oMade = TypeOfBand(GDALGetRasterBand(hDataset, nBand));
         if (!oMade || *oMade != oType)
         {
-            return "the options make channels of " +
-                   (oMade ? DataTypeName(*oMade) : std::string("an unknown type")) +
-                   " out of channels of " + DataTypeName(oType);
+            return ListsType(hDriver, oType)
+                       ? "the options make channels of " +
+                             DataTypeName(oMade.value_or(tessel::DataType())) +
+                             " out of channels of " + DataTypeName(oType)
+                       : CannotHold(hDriver, oType);
         }
     }
     return std::string();
@@ -217,7 +221,7 @@ std::shared_ptr<GdalFile> GdalFile::Create(const std::string& oFile, const std::
         throw FileException(oFile + ": cannot make the file: " + oErrors.GetText(), oFile, kSource,
                             __PRETTY_FUNCTION__, __LINE__);
     }
-    const std::string oUnexpected = UnexpectedType(poDataset.get(), oInfo.moDataType);
+    const std::string oUnexpected = UnexpectedType(hDriver, poDataset.get(), oInfo.moDataType);
     if (!oUnexpected.empty())
     {
         poDataset.reset();

@@ -2,7 +2,9 @@
 
 #include <cpl_error.h>
 #include <gtest/gtest.h>
+#include <sys/resource.h>
 
+#include <csignal>
 #include <memory>
 #include <string>
 #include <vector>
@@ -17,6 +19,29 @@
 
 namespace kor::test
 {
+
+/// While it lives, files of this process cannot grow beyond a size: a disk that is full.
+class FullDisk
+{
+public:
+    explicit FullDisk(rlim_t nBytes) : mpFormerHandler(std::signal(SIGXFSZ, SIG_IGN))
+    {
+        getrlimit(RLIMIT_FSIZE, &moFormer);
+        const rlimit oLimit{nBytes, moFormer.rlim_max};
+        setrlimit(RLIMIT_FSIZE, &oLimit);
+    }
+    FullDisk(const FullDisk&) = delete;
+    FullDisk& operator=(const FullDisk&) = delete;
+    ~FullDisk()
+    {
+        setrlimit(RLIMIT_FSIZE, &moFormer);
+        std::signal(SIGXFSZ, mpFormerHandler);
+    }
+
+private:
+    rlimit moFormer{};
+    void (*mpFormerHandler)(int);
+};
 
 /// A test with files of its own. It fails when GDAL reports anything past the library, which would
 /// have been printed.

@@ -66,5 +66,19 @@ TEST_F(WritePngTest, FailureLeavesNothingBehind)
     EXPECT_EQ(moDirectory.Names(), (std::set<std::string>{"taken.png"}));
 }
 
+TEST_F(WritePngTest, OlderPictureOutlivesAFullDisk)
+{
+    test::Random oRandom(1);
+    const auto poRaster =
+        test::RandomRaster(300, 300, 3, tessel::eDT_8U, {}, test::Samples::Ordinary, oRandom);
+    WritePng(File("x.png"), *test::RasterOf(Bytes{{1, 2}}));
+    {
+        const test::FullDisk oFull(10000);
+        EXPECT_THROW(WritePng(File("x.png"), *poRaster), FileException);
+    }
+    EXPECT_EQ(test::ImageOf<std::uint8_t>(*ReadFile(File("x.png"))), (Bytes{{1, 2}}));
+    EXPECT_EQ(moDirectory.Names(), (std::set<std::string>{"x.png"}));
+}
+
 }  // namespace
 }  // namespace kor::datasources
