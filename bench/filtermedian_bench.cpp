@@ -27,6 +27,29 @@ void BM_FilterMedian(benchmark::State& oState)
     oState.SetItemsProcessed(oState.iterations() * kBlock.Pixels());
 }
 
+/// The same beside an input mask that clears the left eighth of the block and its first row.
+template <class T>
+void BM_FilterMedianMasked(benchmark::State& oState)
+{
+    const auto nHalf = static_cast<std::uint32_t>(oState.range(0)) / 2;
+    const OMPThreadCount oThreads(static_cast<int>(oState.range(1)));
+    const filters::FilterMedian oFilter;
+    const auto poIn = SpeckleRaster<T>(kBlock, Margins{nHalf, nHalf}, kSeed);
+    const auto poOut = MakeRaster<T>(kBlock, Margins{0, 0});
+    std::vector<unsigned char> vValid(std::size_t{poIn->mnTotalWidth} * poIn->mnTotalHeight);
+    for (std::size_t i = 0; i < vValid.size(); ++i)
+    {
+        const bool bValid = i % poIn->mnTotalWidth >= kBlock.nWidth / 8 && i >= poIn->mnTotalWidth;
+        vValid[i] = bValid ? 1 : 0;
+    }
+    tessel::Mask oMask(*poIn, *poIn, vValid.data(), false, false);
+    for (auto _ : oState)
+    {
+        oFilter.Process(poIn.get(), &oMask, poOut.get(), nullptr);
+    }
+    oState.SetItemsProcessed(oState.iterations() * kBlock.Pixels());
+}
+
 /// The definition: the samples of the window as doubles, and the one in the middle.
 template <class T>
 T PlainMedian(const tessel::Raster& oIn, std::int64_t x, std::int64_t y)
@@ -69,13 +92,15 @@ void BM_PlainMedian(benchmark::State& oState)
 void SidesAndThreads(benchmark::internal::Benchmark* poBenchmark)
 {
     poBenchmark->ArgNames({"side", "threads"})->UseRealTime();
-    poBenchmark->ArgsProduct({{3, 5, 7, 9}, {1, OMPGetMaxThreads()}});
+    poBenchmark->ArgsProduct({{3, 5, 7, 9, 11}, {1, OMPGetMaxThreads()}});
 }
 
 BENCHMARK_TEMPLATE(BM_FilterMedian, unsigned char)->Apply(SidesAndThreads);
 BENCHMARK_TEMPLATE(BM_FilterMedian, unsigned short)->Apply(SidesAndThreads);
 BENCHMARK_TEMPLATE(BM_FilterMedian, float)->Apply(SidesAndThreads);
 BENCHMARK_TEMPLATE(BM_FilterMedian, double)->Apply(SidesAndThreads);
+BENCHMARK_TEMPLATE(BM_FilterMedianMasked, unsigned char)->Apply(SidesAndThreads);
+BENCHMARK_TEMPLATE(BM_FilterMedianMasked, double)->Apply(SidesAndThreads);
 BENCHMARK_TEMPLATE(BM_PlainMedian, unsigned char)->ArgName("side")->Arg(3)->Arg(5)->Arg(7);
 BENCHMARK_TEMPLATE(BM_PlainMedian, unsigned short)->ArgName("side")->Arg(3)->Arg(5)->Arg(7);
 BENCHMARK_TEMPLATE(BM_PlainMedian, float)->ArgName("side")->Arg(3)->Arg(5)->Arg(7);

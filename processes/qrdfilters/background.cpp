@@ -1,7 +1,6 @@
 #include "processes/qrdfilters/background.h"
 
 #include <array>
-#include <cstring>
 #include <functional>
 
 namespace kor::filters
@@ -27,19 +26,6 @@ void FindComputedPixels(const tessel::Mask* poMaskIn, const tessel::Mask* poMask
         poMaskOut->ExpandRow(x + static_cast<std::int64_t>(i), y, {anOut.data(), oPart.size()});
         std::transform(oPart.begin(), oPart.end(), anOut.begin(), oPart.begin(), std::bit_and<>());
     }
-}
-
-std::size_t FindByte(std::span<const unsigned char> oBytes, std::size_t nFirst,
-                     unsigned char nValue)
-{
-    if (nFirst == oBytes.size())
-    {
-        return nFirst;
-    }
-    const void* pFound = std::memchr(&oBytes[nFirst], nValue, oBytes.size() - nFirst);
-    return pFound == nullptr ? oBytes.size()
-                             : static_cast<std::size_t>(static_cast<const unsigned char*>(pFound) -
-                                                        oBytes.data());
 }
 
 }  // namespace kor::filters

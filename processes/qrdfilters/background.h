@@ -1,10 +1,12 @@
 #pragma once
 
 #include <algorithm>
+#include <cstddef>
 #include <cstdint>
 #include <span>
 
 #include "basic/tessel/mask/mask.h"
+#include "processes/qrdfilters/findbyte.h"
 #include "processes/qrdfilters/samplerows.h"
 
 namespace kor::filters
@@ -16,23 +18,18 @@ namespace kor::filters
 void FindComputedPixels(const tessel::Mask* poMaskIn, const tessel::Mask* poMaskOut, std::int64_t x,
                         std::int64_t y, std::span<unsigned char> oComputed);
 
-/// Position of the first byte from nFirst on that is nValue, or the number of bytes.
-std::size_t FindByte(std::span<const unsigned char> oBytes, std::size_t nFirst,
-                     unsigned char nValue);
-
 /// Writes the background over a row of pixels of nChannels samples where oComputed is 0: zeros, or
 /// with bBGZero false the samples of pIn, converted.
 template <class TIn, class TOut>
 void WriteBackground(std::span<const unsigned char> oComputed, const TIn* pIn,
                      std::size_t nChannels, bool bBGZero, TOut* pOut)
 {
-    std::size_t nEnd = 0;
-    for (std::size_t x = FindByte(oComputed, 0, 0); x < oComputed.size();
-         x = FindByte(oComputed, nEnd, 0))
+    std::size_t nFirst = FindByte(oComputed, 0, 0);
+    while (nFirst != oComputed.size())
     {
-        nEnd = FindByte(oComputed, x, 1);
-        const std::size_t nStart = x * nChannels;
-        const std::size_t nCount = (nEnd - x) * nChannels;
+        const std::size_t nEnd = FindByte(oComputed, nFirst, 1);
+        const std::size_t nStart = nFirst * nChannels;
+        const std::size_t nCount = (nEnd - nFirst) * nChannels;
         if (bBGZero)
         {
             std::fill_n(pOut + nStart, nCount, TOut(0));
@@ -41,6 +38,7 @@ void WriteBackground(std::span<const unsigned char> oComputed, const TIn* pIn,
         {
             ConvertSamples<TIn, TOut>(pIn + nStart, pOut + nStart, nCount);
         }
+        nFirst = FindByte(oComputed, nEnd, 0);
     }
 }
 

@@ -112,7 +112,7 @@ void FilterMedian::InnerProcessor<TIn, TOut>::WriteMedians(const MedianSelection
     }
     else
     {
-        const std::size_t nSamples = std::size_t{oRasterOut.mnWidth} * oRasterOut.mnChannels;
+        const std::size_t nSamples = oMedians.RowSamples();
         std::vector<TIn> vSelected((nEnd - nFirst) * nSamples);
         oMedians.SelectRows(nFirst, nEnd, oComputed, vSelected.data(), nSamples);
         for (std::uint32_t y = nFirst; y < nEnd; ++y)

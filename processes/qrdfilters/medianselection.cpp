@@ -5,6 +5,7 @@
 #include <vector>
 
 #include "basic/core/typedispatch/typelist.h"
+#include "processes/qrdfilters/findbyte.h"
 #include "processes/qrdfilters/kernels/median.h"
 #include "processes/qrdfilters/sampleconversion.h"
 #include "processes/qrdfilters/validwindows.h"
@@ -60,19 +61,33 @@ void MedianSelection<T>::SelectRows(std::uint32_t nFirst, std::uint32_t nEnd,
             return;
         }
     }
-    std::vector<unsigned char> vWhole(bNetwork ? moIn.mnWidth : 0);
+    std::vector<unsigned char> vWanted(moIn.mnWidth);
     std::vector<T> vGather(mnWindowWidth * mnWindowHeight * moIn.mnChannels);
     for (std::uint32_t y = nFirst; y < nEnd; ++y)
     {
+        const std::size_t nRow = y - nFirst;
+        std::fill(vWanted.begin(), vWanted.end(), static_cast<unsigned char>(1));
+        if (!oComputed.empty())
+        {
+            std::copy_n(oComputed.data() + nRow * moIn.mnWidth, moIn.mnWidth, vWanted.begin());
+        }
         if (bNetwork)
         {
-            FindWholeWindows(*mpoValid, moIn.mnMarginX, moIn.mnMarginY, y, vWhole);
+            DropWholeWindows(y, vWanted);
         }
-        const std::size_t nRow = y - nFirst;
-        const auto oRow =
-            oComputed.empty() ? oComputed : oComputed.subspan(nRow * moIn.mnWidth, moIn.mnWidth);
-        SelectPixels(y, oRow, vWhole, vGather, pOut + nRow * nOutPitch);
+        SelectPixels(y, vWanted, vGather, pOut + nRow * nOutPitch);
     }
+}
+
+/// Clears the pixels of row y in whose windows no pixel is masked: the network has served them.
+template <class T>
+void MedianSelection<T>::DropWholeWindows(std::uint32_t y, std::span<unsigned char> oWanted) const
+{
+    std::vector<unsigned char> vWhole(oWanted.size());
+    FindWholeWindows(*mpoValid, moIn.mnMarginX, moIn.mnMarginY, y, vWhole);
+    std::transform(oWanted.begin(), oWanted.end(), vWhole.begin(), oWanted.begin(),
+                   [](unsigned char nWanted, unsigned char nWhole)
+                   { return static_cast<unsigned char>(nWanted & ~nWhole); });
 }
 
 template <class T>
@@ -86,24 +101,20 @@ void MedianSelection<T>::SelectByNetwork(std::uint32_t nFirst, std::uint32_t nEn
     oBlock.nStep = moIn.mnChannels;
     oBlock.pOut = reinterpret_cast<Arithmetic<T>*>(pOut);
     oBlock.nOutPitch = nOutPitch;
-    oBlock.nSamples = std::size_t{moIn.mnWidth} * moIn.mnChannels;
+    oBlock.nSamples = RowSamples();
     oBlock.nRows = nEnd - nFirst;
     kernels::SelectMedians(mnWindowWidth, oBlock);
 }
 
 template <class T>
-void MedianSelection<T>::SelectPixels(std::uint32_t y, std::span<const unsigned char> oComputed,
-                                      std::span<const unsigned char> oWhole, std::span<T> oGather,
-                                      T* pOut) const
+void MedianSelection<T>::SelectPixels(std::uint32_t y, std::span<const unsigned char> oWanted,
+                                      std::span<T> oGather, T* pOut) const
 {
     using A = Arithmetic<T>;
     const std::size_t nArea = mnWindowWidth * mnWindowHeight;
-    for (std::uint32_t x = 0; x < moIn.mnWidth; ++x)
+    for (std::size_t x = FindByte(oWanted, 0, 1); x < oWanted.size();
+         x = FindByte(oWanted, x + 1, 1))
     {
-        if ((!oComputed.empty() && oComputed[x] == 0) || (!oWhole.empty() && oWhole[x] != 0))
-        {
-            continue;
-        }
         const std::size_t nCount = Gather(x, y, oGather);
         for (std::size_t c = 0; c < moIn.mnChannels; ++c)
         {
@@ -117,11 +128,11 @@ void MedianSelection<T>::SelectPixels(std::uint32_t y, std::span<const unsigned 
 /// Collects the valid samples of a window, those of each channel together with room for a whole
 /// window, and returns how many there are.
 template <class T>
-std::size_t MedianSelection<T>::Gather(std::uint32_t x, std::uint32_t y, std::span<T> oGather) const
+std::size_t MedianSelection<T>::Gather(std::size_t x, std::uint32_t y, std::span<T> oGather) const
 {
     const std::size_t nChannels = moIn.mnChannels;
     const std::size_t nArea = mnWindowWidth * mnWindowHeight;
-    const std::int64_t nLeft = std::int64_t{x} - moIn.mnMarginX;
+    const std::int64_t nLeft = static_cast<std::int64_t>(x) - moIn.mnMarginX;
     const std::int64_t nTop = std::int64_t{y} - moIn.mnMarginY;
     std::size_t nCount = 0;
     for (std::size_t r = 0; r < mnWindowHeight; ++r)

@@ -23,19 +23,24 @@ public:
     /// poValid: null, or 0 or 1 a pixel with the geometry of oIn; a pixel of 0 is in no window.
     MedianSelection(const tessel::Raster& oIn, const tessel::Raster* poValid);
 
+    /// Samples of a row without its margins.
+    std::size_t RowSamples() const { return std::size_t{moIn.mnWidth} * moIn.mnChannels; }
+
     /// Writes the medians of rows nFirst to nEnd - 1: pOut[(y - nFirst) * nOutPitch + i] gets
-    /// sample i of row y. oComputed holds, row by row, 1 for each pixel that is wanted; what is
-    /// written for the others has no meaning. A pixel that is wanted is in its own window.
+    /// sample i of row y. oComputed holds, row by row, 1 for each pixel that is wanted; empty, it
+    /// stands for all. What is written for the others has no meaning. A pixel that is wanted is in
+    /// its own window.
     void SelectRows(std::uint32_t nFirst, std::uint32_t nEnd,
                     std::span<const unsigned char> oComputed, T* pOut, std::size_t nOutPitch) const;
 
 private:
     void SelectByNetwork(std::uint32_t nFirst, std::uint32_t nEnd, T* pOut,
                          std::size_t nOutPitch) const;
-    /// Selects pixel by pixel where pWanted is 1 and oWhole, unless it is empty, is 0.
-    void SelectPixels(std::uint32_t y, std::span<const unsigned char> oComputed,
-                      std::span<const unsigned char> oWhole, std::span<T> oGather, T* pOut) const;
-    std::size_t Gather(std::uint32_t x, std::uint32_t y, std::span<T> oGather) const;
+    void DropWholeWindows(std::uint32_t y, std::span<unsigned char> oWanted) const;
+    /// Selects pixel by pixel where oWanted is 1.
+    void SelectPixels(std::uint32_t y, std::span<const unsigned char> oWanted, std::span<T> oGather,
+                      T* pOut) const;
+    std::size_t Gather(std::size_t x, std::uint32_t y, std::span<T> oGather) const;
 
     const tessel::Raster& moIn;
     const tessel::Raster* mpoValid;

@@ -7,7 +7,7 @@
 // output rows have in common are merged once, as far as the few ranks in the middle that the median
 // can have; and each output row adds the row that is its own. Lanes run along the row: no sample
 // ever changes its lane, and channels need no care. Minima and maxima for a sample: 16 for 3 x 3,
-// 59 for 5 x 5, 128 for 7 x 7.
+// 59 for 5 x 5, 128 for 7 x 7, 242 for 9 x 9.
 //
 // Source   A. Adams, "Fast median filters using separable sorting networks", ACM Transactions on
 //          Graphics 40(4), 70, 2021; here with tiles one sample wide.
@@ -199,8 +199,13 @@ private:
         Merge<kSide, kSide, kPairFirst, kPairFirst + kPairRanks>(maoLower, Own(q + 1), Pair(q));
     }
 
+    /// The ranks in the middle of the pairs that output rows 2s and 2s + 1 have in common. Ranks
+    /// that can be no median's are left out on the way. From 7 x 7 on, four output rows have all
+    /// pairs in common but the uppermost one of the first two rows and the lowest one of the last
+    /// two.
     HWY_INLINE void MergeCommon(std::size_t s, V* HWY_RESTRICT pCommon)
     {
+        const std::size_t nOther = s % 2 == 0 ? s : s + kHalf - 1;
         if constexpr (kHalf == 1)
         {
             Copy(Pair(s), pCommon, std::make_index_sequence<4>());
@@ -209,15 +214,27 @@ private:
         {
             Merge<10, 10, 7, 13>(Pair(s), Pair(s + 1), pCommon);
         }
-        else
+        else if constexpr (kHalf == 3)
         {
-            // Four output rows have two pairs in common. Ranks 3 to 24 of their 28 samples matter,
-            // and with the third pair ranks 17 to 24 of 42, 14 to 21 without the three left out.
             if (s % 2 == 0)
             {
+                // Ranks 3 to 24 of 28.
                 Merge<14, 14, 3, 25>(Pair(s + 1), Pair(s + 2), maoShared);
             }
-            Merge<22, 14, 14, 22>(maoShared, Pair(s % 2 == 0 ? s : s + 2), pCommon);
+            // Ranks 17 to 24 of 42, without the three left out.
+            Merge<22, 14, 14, 22>(maoShared, Pair(nOther), pCommon);
+        }
+        else
+        {
+            if (s % 2 == 0)
+            {
+                // Ranks 13 to 40 of 54.
+                V aoTwo[36];
+                Merge<18, 18, 0, 36>(Pair(s + 1), Pair(s + 2), aoTwo);
+                Merge<36, 18, 13, 41>(aoTwo, Pair(s + 3), maoShared);
+            }
+            // Ranks 31 to 40 of 72, without the 13 left out.
+            Merge<28, 18, 18, 28>(maoShared, Pair(nOther), pCommon);
         }
     }
 
@@ -237,7 +254,7 @@ private:
     V maaoPairs[kHalf + 1][kPairRanks];
     V maaoOwn[kHalf + 2][kSide];
     V maoLower[kSide];
-    V maoShared[22];
+    V maoShared[kHalf == 3 ? 22 : kHalf == 4 ? 28 : 1];
 };
 
 /// Columns that go down the rows side by side: whole cache lines of a row, as many as the
@@ -326,6 +343,9 @@ void SelectMediansOf(std::size_t nSide, const MedianBlock<T>& oBlock)
             break;
         case 7:
             SelectBlock<T, 3>(oBlock);
+            break;
+        case 9:
+            SelectBlock<T, 4>(oBlock);
             break;
     }
 }

@@ -10,7 +10,7 @@ namespace kor::filters::kernels
 /// True when SelectMedians knows windows of nSide x nSide samples.
 constexpr bool HasMedianNetwork(std::size_t nSide)
 {
-    return nSide == 3 || nSide == 5 || nSide == 7;
+    return nSide == 3 || nSide == 5 || nSide == 7 || nSide == 9;
 }
 
 /// Rows of samples to read and to write. Output sample i of row y is the median of the samples

@@ -22,7 +22,7 @@ using test::Random;
 using test::RandomSample;
 using test::Samples;
 
-constexpr std::size_t kSides[] = {3, 5, 7};
+constexpr std::size_t kSides[] = {3, 5, 7, 9};
 
 template <class Visit>
 void ForEachLaneType(const Visit& oVisit)
@@ -242,11 +242,12 @@ TEST_P(SelectMediansTest, ChoosesAsAllOtherInstructionSetsDo)
     oTest.operator()<double>();
 }
 
-TEST(HasMedianNetwork, KnowsThreeSides)
+TEST(HasMedianNetwork, KnowsFourSides)
 {
     for (std::size_t nSide = 1; nSide < 20; ++nSide)
     {
-        EXPECT_EQ(HasMedianNetwork(nSide), nSide == 3 || nSide == 5 || nSide == 7) << nSide;
+        EXPECT_EQ(HasMedianNetwork(nSide), nSide == 3 || nSide == 5 || nSide == 7 || nSide == 9)
+            << nSide;
     }
 }
 
