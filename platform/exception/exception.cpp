@@ -27,9 +27,9 @@ ParameterException::ParameterException(std::string oParameterName, Type eType,
       moParameterName(std::move(oParameterName)),
       meType(eType),
       moFirstText(std::move(oFirstText)),
-      moSecondText(std::move(oSecondText))
+      moSecondText(std::move(oSecondText)),
+      moWhat(GetMessage())
 {
-    moWhat = GetMessage();
     if (moWhat.empty())
     {
         moWhat = moParameterName.empty() ? moFirstText : moParameterName + ": " + moFirstText;

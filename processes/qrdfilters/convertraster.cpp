@@ -7,6 +7,18 @@
 #include "processes/qrdfilters/hardened.h"
 #include "processes/qrdfilters/sampleconversion.h"
 
+namespace kor::typedispatch
+{
+
+template IConvertTo* DualDispatch<filters::ConvertTo>::Create(const tessel::DataType&,
+                                                              const tessel::DataType&);
+template IConvertTo* DualDispatch<filters::ConvertToComplex>::Create(const tessel::DataType&,
+                                                                     const tessel::DataType&);
+template IConvertTo* DualDispatch<filters::ConvertToIntensity>::Create(const tessel::DataType&,
+                                                                       const tessel::DataType&);
+
+}  // namespace kor::typedispatch
+
 namespace kor::filters
 {
 
@@ -95,7 +107,7 @@ void details::ConvertIntensityRow(std::size_t nIn, std::size_t nOut, const void*
 
 void ConvertRaster(const Raster* poIn, Raster* poOut)
 {
-    if constexpr (kHardened)
+    if (kHardened)
     {
         RequireRoom(poIn, poOut);
     }

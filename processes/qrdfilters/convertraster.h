@@ -85,3 +85,15 @@ public:
 };
 
 }  // namespace kor::filters
+
+namespace kor::typedispatch
+{
+
+extern template IConvertTo* DualDispatch<filters::ConvertTo>::Create(const tessel::DataType& oIn,
+                                                                     const tessel::DataType& oOut);
+extern template IConvertTo* DualDispatch<filters::ConvertToComplex>::Create(
+    const tessel::DataType& oIn, const tessel::DataType& oOut);
+extern template IConvertTo* DualDispatch<filters::ConvertToIntensity>::Create(
+    const tessel::DataType& oIn, const tessel::DataType& oOut);
+
+}  // namespace kor::typedispatch

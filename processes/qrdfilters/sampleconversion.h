@@ -28,7 +28,7 @@ constexpr TOut RoundAndClamp(TIn x)
     constexpr auto kUpperTest = static_cast<TIn>(kHighest);
     constexpr TIn kHalf = TIn(0.5);
 
-    if (x != x)
+    if (x != x)  // NOLINT(misc-redundant-expression): not a number, in a constant expression too
     {
         return 0;
     }

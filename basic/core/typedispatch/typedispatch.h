@@ -106,17 +106,7 @@ public:
 
     /// The conversion for a pair of types, which the caller owns; null for a type without elements
     /// (eDT_BIT, unsigned floats).
-    static IConvertTo* Create(const tessel::DataType& oIn, const tessel::DataType& oOut)
-    {
-        return VisitType<NativeTypeList>(
-            NativeCode(oIn),
-            [&oOut]<class T1>() -> IConvertTo*
-            {
-                auto poHolder = std::make_unique<FirstDataTypeHolder<T1>>(oOut);
-                return poHolder->IsComplete() ? poHolder.release() : nullptr;
-            },
-            []() -> IConvertTo* { return nullptr; });
-    }
+    static IConvertTo* Create(const tessel::DataType& oIn, const tessel::DataType& oOut);
 
 private:
     static std::size_t NativeCode(const tessel::DataType& oType)
@@ -124,5 +114,19 @@ private:
         return tessel::NativeDataType(oType.mbComplex ? tessel::RealPartType(oType) : oType).mnCode;
     }
 };
+
+// Outside the class and so not inline: a family that is declared extern is compiled once.
+template <template <class, class> class Op>
+IConvertTo* DualDispatch<Op>::Create(const tessel::DataType& oIn, const tessel::DataType& oOut)
+{
+    return VisitType<NativeTypeList>(
+        NativeCode(oIn),
+        [&oOut]<class T1>() -> IConvertTo*
+        {
+            auto poHolder = std::make_unique<FirstDataTypeHolder<T1>>(oOut);
+            return poHolder->IsComplete() ? poHolder.release() : nullptr;
+        },
+        []() -> IConvertTo* { return nullptr; });
+}
 
 }  // namespace kor::typedispatch

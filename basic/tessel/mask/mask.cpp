@@ -188,11 +188,11 @@ void Mask::ExpandBits(std::uint64_t nFirst, std::span<unsigned char> oBytes) con
         {
             nByte = ((nByte << nShift) | (pBits[1] >> (8 - nShift))) & 0xFFU;
         }
-        std::memcpy(&oBytes[i], &kMaskBitTable[nByte * 8], 8);
+        std::memcpy(&oBytes[i], &kMaskBitTable[std::size_t{nByte} * 8], 8);
     }
     for (std::uint64_t nBit = nFirst + i; i < oBytes.size(); ++i, ++nBit)
     {
-        oBytes[i] = kMaskBitTable[moBits[nBit >> 3] * 8U + (nBit & 7U)];
+        oBytes[i] = kMaskBitTable[std::size_t{moBits[nBit >> 3]} * 8 + (nBit & 7U)];
     }
 }
 

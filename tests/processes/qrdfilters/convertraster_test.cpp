@@ -19,44 +19,47 @@ namespace
 using tessel::DataType;
 using tessel::Raster;
 using test::BlankRaster;
+using test::ComplexElementType;
+using test::ConversionSamples;
+using test::Converted;
+using test::Elements;
+using test::ElementType;
+using test::ForEachTypePair;
+using test::kElementTypes;
 using test::Margins;
+using test::Random;
 using test::RandomRaster;
-using typedispatch::ComplexDataType;
+using test::ReferenceConversion;
+using test::ReferenceIntensity;
+using test::SameElements;
+using test::Samples;
 using typedispatch::DualDispatch;
-using typedispatch::RealDataType;
 
-/// The elements of the whole buffer, margins included.
+/// The samples of the whole buffer, margins included and parts one by one.
 template <class T>
-std::vector<T> Elements(const Raster& oRaster)
+std::vector<T> AllSamples(const Raster& oRaster)
 {
     const T* pFirst = reinterpret_cast<const T*>(oRaster.mpBuffer);
     return std::vector<T>(pFirst, pFirst + oRaster.mnBufferSize / sizeof(T));
 }
 
+/// The same of element type nType.
+Elements ElementsOf(const Raster& oRaster, std::size_t nType)
+{
+    Elements oElements(nType, oRaster.mnBufferSize / ElementType(nType).GetSampleBytes());
+    std::memcpy(oElements.Data(), oRaster.mpBuffer, oRaster.mnBufferSize);
+    return oElements;
+}
+
 template <class T>
-std::unique_ptr<Raster> RasterOf(const std::vector<T>& vElements, std::uint32_t nChannels,
-                                 const DataType& oType)
+std::unique_ptr<Raster> FlatRaster(const std::vector<T>& vElements, std::uint32_t nChannels,
+                                   const DataType& oType)
 {
     const auto nWidth = static_cast<std::uint32_t>(vElements.size() * sizeof(T) /
                                                    (oType.GetSampleBytes() * nChannels));
     auto poRaster = BlankRaster(nWidth, 1, nChannels, oType);
     std::memcpy(poRaster->mpBuffer, vElements.data(), poRaster->mnBufferSize);
     return poRaster;
-}
-
-template <class T>
-::testing::AssertionResult SameElements(const Raster& oRaster, const std::vector<T>& vExpected)
-{
-    const std::vector<T> vElements = Elements<T>(oRaster);
-    for (std::size_t i = 0; i < vExpected.size(); ++i)
-    {
-        if (!test::SameSample(vElements.at(i), vExpected[i]))
-        {
-            return ::testing::AssertionFailure()
-                   << "element " << i << " is " << +vElements[i] << " and not " << +vExpected[i];
-        }
-    }
-    return ::testing::AssertionSuccess();
 }
 
 /// A conversion of each family that somebody outside makes without a dispatch.
@@ -91,30 +94,36 @@ TEST(ConvertToIntensity, SumsTheSquaresOfEachPair)
     EXPECT_EQ(anOut, (std::array<unsigned char, 3>{25, 32, 9}));  // 20000 - 78 * 256
 }
 
-template <class TIn, class TOut, template <class, class> class Family>
-void ExpectMadeByDispatch()
+/// What the family's conversion for a pair of types makes of pairs of random samples.
+template <template <class, class> class Family>
+Elements Made(std::size_t nIn, std::size_t nOut, const Elements& oIn, std::size_t nCount,
+              std::size_t nElementsOut)
 {
     const std::unique_ptr<IConvertTo> poMade(
-        DualDispatch<Family>::Create(RealDataType<TIn>(), RealDataType<TOut>()));
-    ASSERT_NE(poMade, nullptr);
-    const std::vector<TIn> vIn = {TIn(3), TIn(4), TIn(5), TIn(6)};
-    std::vector<TOut> vOut(4, TOut(9));
-    std::vector<TOut> vExpected(4, TOut(9));
-    (*poMade)(vIn.data(), vOut.data(), 2);
-    Family<TIn, TOut>()(vIn.data(), vExpected.data(), 2);
-    EXPECT_EQ(vOut, vExpected);
-    EXPECT_NE(vOut, std::vector<TOut>(4, TOut(9)));
+        DualDispatch<Family>::Create(ElementType(nIn), ElementType(nOut)));
+    Elements oOut(nOut, nElementsOut);
+    (*poMade)(oIn.Data(), oOut.Data(), nCount);
+    return oOut;
 }
 
 TEST(ConversionFamilies, AreMadeByDispatchForAllHundredPairs)
 {
-    test::ForEachTypePair(
-        []<class TIn, class TOut>()
-        {
-            ExpectMadeByDispatch<TIn, TOut, ConvertTo>();
-            ExpectMadeByDispatch<TIn, TOut, ConvertToComplex>();
-            ExpectMadeByDispatch<TIn, TOut, ConvertToIntensity>();
-        });
+    Random oRandom(12);
+    const auto oCompare = [&](std::size_t nIn, std::size_t nOut)
+    {
+        const Elements oIn = ConversionSamples(nIn, oRandom);
+        const std::size_t nAll = oIn.Size();
+        EXPECT_TRUE(SameElements(Made<ConvertTo>(nIn, nOut, oIn, nAll, nAll),
+                                 Converted(ReferenceConversion(nIn, nOut), oIn, nOut, nAll)));
+        EXPECT_TRUE(SameElements(Made<ConvertToIntensity>(nIn, nOut, oIn, nAll / 2, nAll / 2),
+                                 Converted(ReferenceIntensity(nIn, nOut), oIn, nOut, nAll / 2)));
+        Elements oCleared(nOut, 6);
+        const std::size_t nBytes = ElementType(nOut).GetSampleBytes();
+        std::memset(oCleared.Data(), 0, nBytes);
+        std::memset(oCleared.Data() + 2 * nBytes, 0, nBytes);
+        EXPECT_TRUE(SameElements(Made<ConvertToComplex>(nIn, nOut, oIn, 2, 6), oCleared));
+    };
+    ForEachTypePair(oCompare);
 }
 
 TEST(ConversionFamilies, DeriveFromTheirPlaceInTheDispatch)
@@ -124,131 +133,110 @@ TEST(ConversionFamilies, DeriveFromTheirPlaceInTheDispatch)
     EXPECT_TRUE((std::is_base_of_v<IConvertTo, Place>));
 }
 
-TEST(ConvertRaster, ConvertsRealSamplesOfAllPairsWithMarginsAndChannels)
+TEST(ConvertRaster, ConvertsAllSamplesOfAllPairsOneByOne)
 {
-    test::Random oRandom(6);
-    const auto oCompare = [&]<class TIn, class TOut>()
+    Random oRandom(6);
+    const auto oCompare = [&](std::size_t nIn, std::size_t nOut)
     {
-        const auto poIn = RandomRaster(5, 4, 3, RealDataType<TIn>(), Margins{2, 1},
-                                       test::Samples::Special, oRandom);
-        const auto poOut = BlankRaster(5, 4, 3, RealDataType<TOut>(), Margins{2, 1});
-        ConvertRaster(poIn.get(), poOut.get());
-        std::vector<TOut> vExpected;
-        for (const TIn x : Elements<TIn>(*poIn))
+        for (const bool bComplex : {false, true})
         {
-            vExpected.push_back(test::ReferenceSample<TIn, TOut>(x));
+            const DataType oTypeIn = bComplex ? ComplexElementType(nIn) : ElementType(nIn);
+            const DataType oTypeOut = bComplex ? ComplexElementType(nOut) : ElementType(nOut);
+            const auto poIn =
+                RandomRaster(5, 4, 3, oTypeIn, Margins{2, 1}, Samples::Special, oRandom);
+            const auto poOut = BlankRaster(5, 4, 3, oTypeOut, Margins{2, 1});
+            ConvertRaster(poIn.get(), poOut.get());
+            const Elements oIn = ElementsOf(*poIn, nIn);
+            ASSERT_EQ(oIn.Size(), 9U * 6U * 3U * (bComplex ? 2U : 1U));
+            EXPECT_TRUE(
+                SameElements(ElementsOf(*poOut, nOut),
+                             Converted(ReferenceConversion(nIn, nOut), oIn, nOut, oIn.Size())));
         }
-        ASSERT_TRUE(SameElements(*poOut, vExpected));
     };
-    test::ForEachTypePair(oCompare);
-}
-
-TEST(ConvertRaster, ConvertsThePartsOfComplexSamplesOneByOne)
-{
-    test::Random oRandom(7);
-    const auto oCompare = [&]<class TIn, class TOut>()
-    {
-        const auto poIn = RandomRaster(5, 2, 2, ComplexDataType<TIn>(), Margins{1, 2},
-                                       test::Samples::Special, oRandom);
-        const auto poOut = BlankRaster(5, 2, 2, ComplexDataType<TOut>(), Margins{1, 2});
-        ConvertRaster(poIn.get(), poOut.get());
-        std::vector<TOut> vExpected;
-        for (const TIn x : Elements<TIn>(*poIn))
-        {
-            vExpected.push_back(test::ReferenceSample<TIn, TOut>(x));
-        }
-        ASSERT_EQ(vExpected.size(), 7U * 6U * 4U);
-        ASSERT_TRUE(SameElements(*poOut, vExpected));
-    };
-    test::ForEachTypePair(oCompare);
+    ForEachTypePair(oCompare);
 }
 
 TEST(ConvertRaster, MakesChannelsOfThePartsAndPartsOfTheChannels)
 {
     const std::vector<short> vParts = {1, -2, 3, -4, 5, -6};
-    const auto poComplex = RasterOf(vParts, 1, tessel::eDT_C16S);
+    const auto poComplex = FlatRaster(vParts, 1, tessel::eDT_C16S);
     const auto poReal = BlankRaster(3, 1, 2, tessel::eDT_16S);
     ConvertRaster(poComplex.get(), poReal.get());
-    EXPECT_TRUE(SameElements(*poReal, vParts));
+    EXPECT_EQ(AllSamples<short>(*poReal), vParts);
 
     const auto poBack = BlankRaster(3, 1, 1, tessel::eDT_C16S);
     ConvertRaster(poReal.get(), poBack.get());
-    EXPECT_TRUE(SameElements(*poBack, vParts));
+    EXPECT_EQ(AllSamples<short>(*poBack), vParts);
 }
 
 TEST(ConvertRaster, ConvertsWhileItMakesChannelsOfParts)
 {
-    const auto poComplex = RasterOf<float>({2.5F, -2.5F, 300.0F, -0.2F}, 1, tessel::eDT_C32R);
+    const auto poComplex = FlatRaster<float>({2.5F, -2.5F, 300.0F, -0.2F}, 1, tessel::eDT_C32R);
     const auto poReal = BlankRaster(2, 1, 2, tessel::eDT_8U);
     ConvertRaster(poComplex.get(), poReal.get());
-    EXPECT_TRUE(SameElements(*poReal, std::vector<unsigned char>{3, 0, 255, 0}));
+    EXPECT_EQ(AllSamples<unsigned char>(*poReal), (std::vector<unsigned char>{3, 0, 255, 0}));
 
     const auto poBack = BlankRaster(2, 1, 1, tessel::eDT_C64R);
     ConvertRaster(poReal.get(), poBack.get());
-    EXPECT_TRUE(SameElements(*poBack, std::vector<double>{3, 0, 255, 0}));
+    EXPECT_EQ(AllSamples<double>(*poBack), (std::vector<double>{3, 0, 255, 0}));
 }
 
 TEST(ConvertRaster, MakesChannelsOfThePartsOfManyChannelsAndOfEveryType)
 {
-    test::Random oRandom(8);
-    test::ForEachElementType(
-        [&]<class T>()
-        {
-            const auto poComplex = RandomRaster(3, 2, 3, ComplexDataType<T>(), Margins{1, 1},
-                                                test::Samples::Special, oRandom);
-            const auto poReal = BlankRaster(3, 2, 6, RealDataType<T>(), Margins{1, 1});
-            ConvertRaster(poComplex.get(), poReal.get());
-            ASSERT_TRUE(SameElements(*poReal, Elements<T>(*poComplex)));
-            const auto poBack = BlankRaster(3, 2, 3, ComplexDataType<T>(), Margins{1, 1});
-            ConvertRaster(poReal.get(), poBack.get());
-            ASSERT_TRUE(SameElements(*poBack, Elements<T>(*poComplex)));
-        });
+    Random oRandom(8);
+    for (std::size_t nType = 0; nType < kElementTypes; ++nType)
+    {
+        const auto poComplex = RandomRaster(3, 2, 3, ComplexElementType(nType), Margins{1, 1},
+                                            Samples::Special, oRandom);
+        const auto poReal = BlankRaster(3, 2, 6, ElementType(nType), Margins{1, 1});
+        ConvertRaster(poComplex.get(), poReal.get());
+        EXPECT_EQ(AllSamples<unsigned char>(*poReal), AllSamples<unsigned char>(*poComplex));
+        const auto poBack = BlankRaster(3, 2, 3, ComplexElementType(nType), Margins{1, 1});
+        ConvertRaster(poReal.get(), poBack.get());
+        EXPECT_EQ(AllSamples<unsigned char>(*poBack), AllSamples<unsigned char>(*poComplex));
+    }
 }
 
 TEST(ConvertRaster, GivesTheIntensityOfComplexSamplesOfOneChannel)
 {
-    const auto poIn = RasterOf<float>({3, 4, 1, -2, 0.5F, 0}, 1, tessel::eDT_C32R);
+    const auto poIn = FlatRaster<float>({3, 4, 1, -2, 0.5F, 0}, 1, tessel::eDT_C32R);
     const auto poOut = BlankRaster(3, 1, 1, tessel::eDT_32R);
     ConvertRaster(poIn.get(), poOut.get());
-    EXPECT_TRUE(SameElements(*poOut, std::vector<float>{25, 5, 0.25F}));
+    EXPECT_EQ(AllSamples<float>(*poOut), (std::vector<float>{25, 5, 0.25F}));
 }
 
 TEST(ConvertRaster, GivesTheIntensityForAllPairs)
 {
-    test::Random oRandom(9);
-    const auto oCompare = [&]<class TIn, class TOut>()
+    Random oRandom(9);
+    const auto oCompare = [&](std::size_t nIn, std::size_t nOut)
     {
-        const auto poIn = RandomRaster(9, 3, 1, ComplexDataType<TIn>(), Margins{1, 1},
-                                       test::Samples::Special, oRandom);
-        const auto poOut = BlankRaster(9, 3, 1, RealDataType<TOut>(), Margins{1, 1});
+        const auto poIn = RandomRaster(9, 3, 1, ComplexElementType(nIn), Margins{1, 1},
+                                       Samples::Special, oRandom);
+        const auto poOut = BlankRaster(9, 3, 1, ElementType(nOut), Margins{1, 1});
         ConvertRaster(poIn.get(), poOut.get());
-        const std::vector<TIn> vParts = Elements<TIn>(*poIn);
-        std::vector<TOut> vExpected;
-        for (std::size_t k = 0; k < vParts.size(); k += 2)
-        {
-            vExpected.push_back(test::ReferenceIntensity<TIn, TOut>(vParts[k], vParts[k + 1]));
-        }
-        ASSERT_EQ(vExpected.size(), 11U * 5U);
-        ASSERT_TRUE(SameElements(*poOut, vExpected));
+        EXPECT_TRUE(SameElements(
+            ElementsOf(*poOut, nOut),
+            Converted(ReferenceIntensity(nIn, nOut), ElementsOf(*poIn, nIn), nOut, 55)));
     };
-    test::ForEachTypePair(oCompare);
+    ForEachTypePair(oCompare);
 }
 
 // The channels are not counted: of two pixels of three channels, the first two samples.
 TEST(ConvertRaster, GivesTheIntensityOfAsManySamplesAsThereArePixels)
 {
-    const auto poIn = RasterOf<short>({1, 1, 2, 2, 3, 3, 4, 4, 5, 5, 6, 6}, 3, tessel::eDT_C16S);
+    const auto poIn = FlatRaster<short>({1, 1, 2, 2, 3, 3, 4, 4, 5, 5, 6, 6}, 3, tessel::eDT_C16S);
     const auto poOut = BlankRaster(2, 1, 3, tessel::eDT_8U);
     ConvertRaster(poIn.get(), poOut.get());
-    EXPECT_TRUE(SameElements(*poOut, std::vector<unsigned char>{2, 8, 0xA5, 0xA5, 0xA5, 0xA5}));
+    EXPECT_EQ(AllSamples<unsigned char>(*poOut),
+              (std::vector<unsigned char>{2, 8, 0xA5, 0xA5, 0xA5, 0xA5}));
 }
 
 TEST(ConvertRaster, ClearsTheRealPartsOfAComplexOutputOfTheSameChannels)
 {
-    const auto poIn = RasterOf<int>({7, 8, 9}, 1, tessel::eDT_32S);
-    const auto poOut = RasterOf<float>({1, 2, 3, 4, 5, 6}, 1, tessel::eDT_C32R);
+    const auto poIn = FlatRaster<int>({7, 8, 9}, 1, tessel::eDT_32S);
+    const auto poOut = FlatRaster<float>({1, 2, 3, 4, 5, 6}, 1, tessel::eDT_C32R);
     ConvertRaster(poIn.get(), poOut.get());
-    EXPECT_TRUE(SameElements(*poOut, std::vector<float>{0, 2, 0, 4, 0, 6}));
+    EXPECT_EQ(AllSamples<float>(*poOut), (std::vector<float>{0, 2, 0, 4, 0, 6}));
 }
 
 // The channels are not counted here either: two pixels, two samples of the first pixel.
@@ -256,36 +244,36 @@ TEST(ConvertRaster, ClearsAsManyRealPartsAsThereArePixels)
 {
     const auto poIn = BlankRaster(2, 1, 3, tessel::eDT_8U);
     const auto poOut =
-        RasterOf<short>({1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 12}, 3, tessel::eDT_C16S);
+        FlatRaster<short>({1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 12}, 3, tessel::eDT_C16S);
     ConvertRaster(poIn.get(), poOut.get());
-    EXPECT_TRUE(SameElements(*poOut, std::vector<short>{0, 2, 0, 4, 5, 6, 7, 8, 9, 10, 11, 12}));
+    EXPECT_EQ(AllSamples<short>(*poOut),
+              (std::vector<short>{0, 2, 0, 4, 5, 6, 7, 8, 9, 10, 11, 12}));
 }
 
 TEST(ConvertRaster, ClearsRealPartsForAllPairsAndAllMargins)
 {
-    test::Random oRandom(10);
-    const auto oCompare = [&]<class TIn, class TOut>()
+    const auto oCompare = [](std::size_t nIn, std::size_t nOut)
     {
-        const auto poIn = BlankRaster(3, 2, 1, RealDataType<TIn>(), Margins{1, 1});
-        const auto poOut = RandomRaster(3, 2, 1, ComplexDataType<TOut>(), Margins{1, 1},
-                                        test::Samples::Special, oRandom);
-        std::vector<TOut> vExpected = Elements<TOut>(*poOut);
-        for (std::size_t k = 0; k < vExpected.size(); k += 2)
-        {
-            vExpected[k] = TOut(0);
-        }
+        const auto poIn = BlankRaster(3, 2, 1, ElementType(nIn), Margins{1, 1});
+        const auto poOut = BlankRaster(3, 2, 1, ComplexElementType(nOut), Margins{1, 1});
         ConvertRaster(poIn.get(), poOut.get());
-        ASSERT_TRUE(SameElements(*poOut, vExpected));
+        const std::size_t nBytes = ElementType(nOut).GetSampleBytes();
+        for (std::size_t i = 0; i < poOut->mnBufferSize; ++i)
+        {
+            const bool bReal = i / nBytes % 2 == 0;
+            ASSERT_EQ(poOut->mpBuffer[i], bReal ? 0 : 0xA5) << i << " of type " << nOut;
+        }
     };
-    test::ForEachTypePair(oCompare);
+    ForEachTypePair(oCompare);
 }
 
 TEST(ConvertRaster, CountsTheSamplesOfTheInput)
 {
-    const auto poIn = RasterOf<short>({1, 2, 3}, 1, tessel::eDT_16S);
+    const auto poIn = FlatRaster<short>({1, 2, 3}, 1, tessel::eDT_16S);
     const auto poOut = BlankRaster(3, 1, 2, tessel::eDT_8U);
     ConvertRaster(poIn.get(), poOut.get());
-    EXPECT_TRUE(SameElements(*poOut, std::vector<unsigned char>{1, 2, 3, 0xA5, 0xA5, 0xA5}));
+    EXPECT_EQ(AllSamples<unsigned char>(*poOut),
+              (std::vector<unsigned char>{1, 2, 3, 0xA5, 0xA5, 0xA5}));
 }
 
 TEST(ConvertRaster, DoesNothingWithEmptyBlocks)
@@ -325,12 +313,12 @@ TEST(ConvertRaster, RefusesTypesWithoutSamplesAndWritesNothing)
         const auto poOther = BlankRaster(2, 2, 1, oType);
         for (Raster* poKnown : {poReal.get(), poComplex.get()})
         {
-            const std::vector<unsigned char> vKnown = Elements<unsigned char>(*poKnown);
-            const std::vector<unsigned char> vOther = Elements<unsigned char>(*poOther);
+            const std::vector<unsigned char> vKnown = AllSamples<unsigned char>(*poKnown);
+            const std::vector<unsigned char> vOther = AllSamples<unsigned char>(*poOther);
             ExpectError(poOther.get(), poKnown, "Invalid type to dispatch.");
             ExpectError(poKnown, poOther.get(), "Invalid type to dispatch.");
-            EXPECT_EQ(Elements<unsigned char>(*poKnown), vKnown);
-            EXPECT_EQ(Elements<unsigned char>(*poOther), vOther);
+            EXPECT_EQ(AllSamples<unsigned char>(*poKnown), vKnown);
+            EXPECT_EQ(AllSamples<unsigned char>(*poOther), vOther);
         }
     }
 }

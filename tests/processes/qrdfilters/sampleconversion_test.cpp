@@ -313,17 +313,29 @@ TEST(ConvertSample, TakesNotANumberForZeroInEveryInteger)
         });
 }
 
+constexpr auto kConversions = typedispatch::MakePairTable<typedispatch::StandardTypeList>(
+    []<class TIn, class TOut>() -> test::Row
+    {
+        return [](const void* pIn, void* pOut, std::size_t nCount)
+        {
+            for (std::size_t i = 0; i < nCount; ++i)
+            {
+                static_cast<TOut*>(pOut)[i] =
+                    ConvertSample<TIn, TOut>(static_cast<const TIn*>(pIn)[i]);
+            }
+        };
+    });
+
 TEST(ConvertSample, FollowsItsRulesForAllHundredPairs)
 {
     test::Random oRandom(3);
-    const auto oCompare = [&]<class TIn, class TOut>()
+    const auto oCompare = [&](std::size_t nIn, std::size_t nOut)
     {
-        for (const TIn x : test::ConversionSamples<TIn>(oRandom))
-        {
-            ASSERT_TRUE(
-                test::SameSample(ConvertSample<TIn, TOut>(x), test::ReferenceSample<TIn, TOut>(x)))
-                << +x;
-        }
+        const test::Elements oIn = test::ConversionSamples(nIn, oRandom);
+        EXPECT_TRUE(test::SameElements(
+            test::Converted(kConversions[nIn][nOut], oIn, nOut, oIn.Size()),
+            test::Converted(test::ReferenceConversion(nIn, nOut), oIn, nOut, oIn.Size())))
+            << "from type " << nIn << " to type " << nOut;
     };
     test::ForEachTypePair(oCompare);
 }
@@ -400,20 +412,31 @@ TEST(IntensitySample, IsComputedInThePrecisionOfItsParts)
     EXPECT_EQ(Intensity<double>(1e30F, 0.0F), kInfinity);
 }
 
+constexpr auto kIntensities = typedispatch::MakePairTable<typedispatch::StandardTypeList>(
+    []<class TIn, class TOut>() -> test::Row
+    {
+        return [](const void* pIn, void* pOut, std::size_t nCount)
+        {
+            const auto* pParts = static_cast<const TIn*>(pIn);
+            for (std::size_t k = 0; k < nCount; ++k)
+            {
+                static_cast<TOut*>(pOut)[k] =
+                    IntensitySample<TIn, TOut>(pParts[2 * k], pParts[2 * k + 1]);
+            }
+        };
+    });
+
 TEST(IntensitySample, FollowsItsRulesForAllHundredPairs)
 {
     test::Random oRandom(4);
-    const auto oCompare = [&]<class TIn, class TOut>()
+    const auto oCompare = [&](std::size_t nIn, std::size_t nOut)
     {
-        const std::vector<TIn> vSamples = test::ConversionSamples<TIn>(oRandom);
-        for (std::size_t i = 0; i < vSamples.size(); ++i)
-        {
-            const TIn re = vSamples[i];
-            const TIn im = vSamples[oRandom() % vSamples.size()];
-            ASSERT_TRUE(test::SameSample(IntensitySample<TIn, TOut>(re, im),
-                                         test::ReferenceIntensity<TIn, TOut>(re, im)))
-                << +re << " and " << +im;
-        }
+        const test::Elements oIn = test::ConversionSamples(nIn, oRandom);
+        const std::size_t nPairs = oIn.Size() / 2;
+        EXPECT_TRUE(test::SameElements(
+            test::Converted(kIntensities[nIn][nOut], oIn, nOut, nPairs),
+            test::Converted(test::ReferenceIntensity(nIn, nOut), oIn, nOut, nPairs)))
+            << "from type " << nIn << " to type " << nOut;
     };
     test::ForEachTypePair(oCompare);
 }

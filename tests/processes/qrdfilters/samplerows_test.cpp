@@ -11,23 +11,28 @@ namespace kor::filters
 namespace
 {
 
+constexpr auto kRows = typedispatch::MakePairTable<typedispatch::StandardTypeList>(
+    []<class TIn, class TOut>() -> test::Row
+    {
+        return [](const void* pIn, void* pOut, std::size_t nCount) {
+            ConvertSamples<TIn, TOut>(static_cast<const TIn*>(pIn), static_cast<TOut*>(pOut),
+                                      nCount);
+        };
+    });
+
 TEST(ConvertSamples, FollowsTheRulesForAllHundredPairsAndOddCounts)
 {
     test::Random oRandom(5);
-    const auto oCompare = [&]<class TIn, class TOut>()
+    const auto oCompare = [&](std::size_t nIn, std::size_t nOut)
     {
-        const std::vector<TIn> vIn = test::ConversionSamples<TIn>(oRandom);
+        const test::Elements oIn = test::ConversionSamples(nIn, oRandom);
         for (const std::size_t nCount :
-             {std::size_t{0}, std::size_t{1}, std::size_t{7}, std::size_t{33}, vIn.size() - 1})
+             {std::size_t{1}, std::size_t{7}, std::size_t{33}, oIn.Size()})
         {
-            std::vector<TOut> vOut(nCount + 1, TOut(99));
-            ConvertSamples<TIn, TOut>(vIn.data() + 1, vOut.data(), nCount);
-            for (std::size_t i = 0; i < nCount; ++i)
-            {
-                ASSERT_TRUE(test::SameSample(vOut[i], test::ReferenceSample<TIn, TOut>(vIn[i + 1])))
-                    << +vIn[i + 1];
-            }
-            ASSERT_EQ(vOut[nCount], TOut(99));
+            ASSERT_TRUE(test::SameElements(
+                test::Converted(kRows[nIn][nOut], oIn, nOut, nCount),
+                test::Converted(test::ReferenceConversion(nIn, nOut), oIn, nOut, nCount)))
+                << nCount << " from type " << nIn << " to type " << nOut;
         }
     };
     test::ForEachTypePair(oCompare);

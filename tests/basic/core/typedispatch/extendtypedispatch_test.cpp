@@ -6,7 +6,7 @@
 #include <string>
 #include <vector>
 
-#include "tests/support/blocks.h"
+#include "tests/support/conversionreference.h"
 
 namespace kor::typedispatch
 {
@@ -91,15 +91,11 @@ constexpr const char* kInvalid = "Invalid type requested.";
 
 TEST(ExtendDispatchTypes, MakesTheProductOfEachOfTheHundredPairs)
 {
-    test::ForEachElementType(
-        []<class TIn>()
+    test::ForEachTypePair(
+        [](std::size_t nIn, std::size_t nOut)
         {
-            test::ForEachElementType(
-                []<class TOut>()
-                {
-                    const Types oTypes = {RealDataType<TIn>(), RealDataType<TOut>()};
-                    EXPECT_EQ((Dispatched<PairFactory, 2>(oTypes, false)), oTypes);
-                });
+            const Types oTypes = {test::ElementType(nIn), test::ElementType(nOut)};
+            EXPECT_EQ((Dispatched<PairFactory, 2>(oTypes, false)), oTypes);
         });
 }
 

@@ -6,7 +6,7 @@
 #include <string>
 #include <utility>
 
-#include "tests/support/blocks.h"
+#include "tests/support/conversionreference.h"
 
 namespace kor::typedispatch
 {
@@ -48,15 +48,11 @@ void ExpectError(const DataType& oIn, const DataType& oOut, unsigned int nLine,
 
 TEST(InputDispatchType, GivesTheProductOfThePolicyForEachPair)
 {
-    test::ForEachElementType(
-        []<class TIn>()
+    test::ForEachTypePair(
+        [](std::size_t nIn, std::size_t nOut)
         {
-            test::ForEachElementType(
-                []<class TOut>()
-                {
-                    const Pair oPair(RealDataType<TIn>(), RealDataType<TOut>());
-                    EXPECT_EQ(Dispatcher::Dispatch(oPair.first, oPair.second), oPair);
-                });
+            const Pair oPair(test::ElementType(nIn), test::ElementType(nOut));
+            EXPECT_EQ(Dispatcher::Dispatch(oPair.first, oPair.second), oPair);
         });
 }
 
@@ -87,11 +83,12 @@ TEST(OutputDispatchType, MayBeCalledByItself)
     EXPECT_EQ(Output::Dispatch(tessel::eDT_64S), Pair(tessel::eDT_16S, tessel::eDT_64S));
 }
 
-/// Writes its two data types and the count into a record.
+/// What an operation was called with: its two data types, the input and the count.
 struct Record
 {
     DataType oIn;
     DataType oOut;
+    const void* pIn = nullptr;
     std::size_t nCount = 0;
 };
 
@@ -106,8 +103,7 @@ public:
     ~WriteRecord() override { --gnLiving; }
     void operator()(const void* pIn, void* pOut, std::size_t nCount) override
     {
-        EXPECT_EQ(pIn, nullptr);
-        *static_cast<Record*>(pOut) = {RealDataType<T1>(), RealDataType<T2>(), nCount};
+        *static_cast<Record*>(pOut) = {RealDataType<T1>(), RealDataType<T2>(), pIn, nCount};
     }
 };
 
@@ -119,9 +115,10 @@ void ExpectRecord(const DataType& oIn, const DataType& oOut, const DataType& oEx
         ASSERT_NE(poOp, nullptr);
         EXPECT_EQ(gnLiving, 1);
         Record oRecord;
-        (*poOp)(nullptr, &oRecord, 42);
+        (*poOp)(&oIn, &oRecord, 42);
         EXPECT_EQ(oRecord.oIn, oExpectedIn);
         EXPECT_EQ(oRecord.oOut, oExpectedOut);
+        EXPECT_EQ(oRecord.pIn, &oIn);
         EXPECT_EQ(oRecord.nCount, 42U);
     }
     EXPECT_EQ(gnLiving, 0);
@@ -129,18 +126,14 @@ void ExpectRecord(const DataType& oIn, const DataType& oOut, const DataType& oEx
 
 TEST(DualDispatch, MakesTheOperationOfEachPairAndDeletesItWithItsHolder)
 {
-    test::ForEachElementType(
-        []<class T1>()
+    test::ForEachTypePair(
+        [](std::size_t nIn, std::size_t nOut)
         {
-            test::ForEachElementType(
-                []<class T2>()
-                {
-                    const DataType oIn = RealDataType<T1>();
-                    const DataType oOut = RealDataType<T2>();
-                    ExpectRecord(oIn, oOut, oIn, oOut);
-                    ExpectRecord(ComplexDataType<T1>(), oOut, oIn, oOut);
-                    ExpectRecord(oIn, ComplexDataType<T2>(), oIn, oOut);
-                });
+            const DataType oIn = test::ElementType(nIn);
+            const DataType oOut = test::ElementType(nOut);
+            ExpectRecord(oIn, oOut, oIn, oOut);
+            ExpectRecord(test::ComplexElementType(nIn), oOut, oIn, oOut);
+            ExpectRecord(oIn, test::ComplexElementType(nOut), oIn, oOut);
         });
 }
 

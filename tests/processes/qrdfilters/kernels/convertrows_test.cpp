@@ -3,7 +3,6 @@
 #include <gtest/gtest.h>
 #include <hwy/tests/hwy_gtest.h>
 
-#include "basic/core/typedispatch/typelist.h"
 #include "tests/support/conversionreference.h"
 
 namespace kor::filters::kernels
@@ -17,29 +16,16 @@ class ConvertRows : public hwy::TestWithParamTarget
 
 HWY_TARGET_INSTANTIATE_TEST_SUITE_P(ConvertRows);
 
-template <class TIn, class TOut>
-RowConversion Find()
-{
-    return FindRowConversion(typedispatch::ElementPosition<TIn>(),
-                             typedispatch::ElementPosition<TOut>());
-}
-
 TEST_P(ConvertRows, GiveTheBitsOfTheRulesAroundEveryLimit)
 {
     test::Random oRandom(1);
-    const auto oCompare = [&]<class TIn, class TOut>()
+    const auto oCompare = [&](std::size_t nIn, std::size_t nOut)
     {
-        const std::vector<TIn> vIn = test::ConversionSamples<TIn>(oRandom);
-        std::vector<TOut> vOut(vIn.size());
-        Find<TIn, TOut>()(vIn.data(), vOut.data(), vIn.size());
-        for (std::size_t i = 0; i < vIn.size(); ++i)
-        {
-            const TOut xExpected = test::ReferenceSample<TIn, TOut>(vIn[i]);
-            ASSERT_TRUE(test::SameSample(vOut[i], xExpected))
-                << "from " << typedispatch::ElementPosition<TIn>() << " to "
-                << typedispatch::ElementPosition<TOut>() << ", " << +vIn[i] << " gives " << +vOut[i]
-                << " and not " << +xExpected;
-        }
+        const test::Elements oIn = test::ConversionSamples(nIn, oRandom);
+        EXPECT_TRUE(test::SameElements(
+            test::Converted(FindRowConversion(nIn, nOut), oIn, nOut, oIn.Size()),
+            test::Converted(test::ReferenceConversion(nIn, nOut), oIn, nOut, oIn.Size())))
+            << "from type " << nIn << " to type " << nOut;
     };
     test::ForEachTypePair(oCompare);
 }
@@ -47,16 +33,18 @@ TEST_P(ConvertRows, GiveTheBitsOfTheRulesAroundEveryLimit)
 // Up to three of the widest vectors of floats, so that every target meets every remainder.
 TEST_P(ConvertRows, WriteAllSamplesOfARowAndNoneBehindIt)
 {
-    const auto oCompare = []<class TIn, class TOut>()
+    test::Random oRandom(2);
+    const auto oCompare = [&](std::size_t nIn, std::size_t nOut)
     {
+        const test::Elements oIn = test::ConversionSamples(nIn, oRandom);
         for (std::size_t nCount = 0; nCount <= 48; ++nCount)
         {
-            const std::vector<TIn> vIn(nCount, TIn(3));
-            std::vector<TOut> vOut(nCount + 64, TOut(7));
-            std::vector<TOut> vExpected(nCount, TOut(3));
-            vExpected.resize(nCount + 64, TOut(7));
-            Find<TIn, TOut>()(vIn.data(), vOut.data(), nCount);
-            ASSERT_EQ(vOut, vExpected) << nCount;
+            test::Elements oActual(nOut, 48 + 64);
+            test::Elements oExpected(nOut, 48 + 64);
+            FindRowConversion(nIn, nOut)(oIn.Data(), oActual.Data(), nCount);
+            test::ReferenceConversion(nIn, nOut)(oIn.Data(), oExpected.Data(), nCount);
+            ASSERT_TRUE(test::SameElements(oActual, oExpected))
+                << nCount << " from type " << nIn << " to type " << nOut;
         }
     };
     test::ForEachTypePair(oCompare);
