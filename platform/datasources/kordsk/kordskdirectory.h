@@ -36,7 +36,7 @@ struct KordskDirectory
 ///     width=640                            pixels
 ///     height=480
 ///     layout=band                          of planes to come; or tile
-///     transform=500000 10 0 4600000 0 -10  as GeocodingInfo::Transform
+///     transform=500005 10 0 4600000 0 -10  as GeocodingInfo::Transform
 ///     projection=PROJCS[...]               left out where empty
 ///     metadata.SENSOR=X                    any number of them
 ///     channel=1                            begins a plane; so does bitmap=1
