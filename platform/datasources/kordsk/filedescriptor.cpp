@@ -20,8 +20,12 @@ namespace
 {
 
 constexpr const char* kSource = "platform/datasources/kordsk/filedescriptor";
+constexpr const char* kReading = "cannot read the file";
+constexpr const char* kWriting = "cannot write the file";
 constexpr int kNewFileMode = 0666;
 constexpr std::size_t kMostVectors = 512;  ///< of one call; half of what Linux takes
+/// Reading so many bytes that nobody wants takes less time than one more call.
+constexpr std::uint64_t kCheapGap = 4096;
 
 std::string ReasonOf(int nError)
 {
@@ -177,15 +181,39 @@ void FileDescriptor::WriteAt(std::uint64_t nOffset, std::span<const unsigned cha
 void FileDescriptor::ReadRows(const FileRows& oRows, unsigned char* pMemory,
                               std::size_t nMemoryPitch) const
 {
-    TransferRows(preadv, "cannot read the file", oRows, pMemory, nMemoryPitch);
+    const std::uint64_t nGap = oRows.mnPitch - oRows.mnBytes;
+    if (oRows.mnCount > 1 && nGap > 0 && nGap <= kCheapGap)
+    {
+        ReadRowsAndGaps(oRows, pMemory, nMemoryPitch);
+        return;
+    }
+    TransferRows(preadv, kReading, oRows, pMemory, nMemoryPitch);
+}
+
+void FileDescriptor::ReadRowsAndGaps(const FileRows& oRows, unsigned char* pMemory,
+                                     std::size_t nMemoryPitch) const
+{
+    std::array<unsigned char, kCheapGap> anGap;
+    std::array<iovec, kMostVectors> aoVectors;
+    for (std::size_t nRow = 0; nRow < oRows.mnCount; nRow += kMostVectors / 2)
+    {
+        const std::size_t nRows = std::min(kMostVectors / 2, oRows.mnCount - nRow);
+        for (std::size_t i = 0; i < nRows; ++i)
+        {
+            aoVectors[2 * i] = {pMemory + (nRow + i) * nMemoryPitch, oRows.mnBytes};
+            aoVectors[2 * i + 1] = {anGap.data(), oRows.mnPitch - oRows.mnBytes};
+        }
+        // Behind the last row the file may end.
+        TransferVectors(preadv, kReading, oRows.mnOffset + nRow * oRows.mnPitch,
+                        std::span(aoVectors).first(2 * nRows - 1));
+    }
 }
 
 void FileDescriptor::WriteRows(const FileRows& oRows, const unsigned char* pMemory,
                                std::size_t nMemoryPitch) const
 {
     // The system takes one kind of vector for both directions and does not write through this one.
-    TransferRows(pwritev, "cannot write the file", oRows, const_cast<unsigned char*>(pMemory),
-                 nMemoryPitch);
+    TransferRows(pwritev, kWriting, oRows, const_cast<unsigned char*>(pMemory), nMemoryPitch);
 }
 
 void FileDescriptor::Reserve(std::uint64_t nOffset, std::uint64_t nBytes) const

@@ -75,6 +75,8 @@ private:
                          std::span<iovec> oVectors) const;
     void TransferRows(VectorCall pCall, const char* pszWhat, const FileRows& oRows,
                       unsigned char* pMemory, std::size_t nMemoryPitch) const;
+    void ReadRowsAndGaps(const FileRows& oRows, unsigned char* pMemory,
+                         std::size_t nMemoryPitch) const;
 
     std::string moFile;
     int mnFile = -1;
