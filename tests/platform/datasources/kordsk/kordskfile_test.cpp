@@ -317,6 +317,27 @@ TEST_F(KordskFileTest, OpeningSeesWhatAnotherProcessHasChanged)
     EXPECT_EQ(poReader->GetAuxiliaryData().GetChannelDescription(1), "of the child");
 }
 
+TEST_F(KordskFileTest, OpeningSucceedsWhileAnotherProcessChangesTheFile)
+{
+    MakeTwoStates();
+    const ChildProcess oChild(
+        [&](int nPipe)
+        {
+            const auto poKordsk = OpenKordsk(moFile, 1);
+            ChildProcess::Send(nPipe, 1);
+            for (int i = 0;; ++i)
+            {
+                // Of changing length, so that directories move about and room is used again.
+                Describe(*poKordsk, "new" + std::string(i % 3 * 3000, 'x'));
+            }
+        });
+    ASSERT_EQ(oChild.Receive(), 1U);
+    for (int i = 0; i < 2000; ++i)
+    {
+        ASSERT_EQ(Description().substr(0, 3), "new");
+    }
+}
+
 /// Runs oAction while files of this process cannot grow beyond nBytes.
 void WithFilesUpTo(std::uint64_t nBytes, const std::function<void()>& oAction)
 {
