@@ -45,46 +45,61 @@ class Axis
 public:
     Axis(std::uint32_t nOffset, std::uint32_t nMargin, std::uint32_t nTotal, std::uint32_t nImage,
          int nEdgeMode)
-        : mvnShown(nTotal)
+        : mnStart(std::int64_t{nOffset} - nMargin),
+          mnImage(nImage),
+          mnEdgeMode(nEdgeMode),
+          mnTotal(nTotal),
+          mnInsideBegin(static_cast<std::uint32_t>(std::clamp<std::int64_t>(-mnStart, 0, mnTotal))),
+          mnInsideEnd(static_cast<std::uint32_t>(
+              std::clamp<std::int64_t>(mnImage - mnStart, mnInsideBegin, mnTotal)))
     {
-        const std::int64_t nStart = std::int64_t{nOffset} - nMargin;
-        std::int64_t nLast = kNothing;
-        for (std::uint32_t i = 0; i < nTotal; ++i)
-        {
-            mvnShown[i] = ShownPosition(nStart + i, nImage, nEdgeMode);
-            if (mvnShown[i] != kNothing)
-            {
-                mnFirst = mnFirst == kNothing ? mvnShown[i] : std::min(mnFirst, mvnShown[i]);
-                nLast = std::max(nLast, mvnShown[i]);
-            }
-        }
-        mnCount = mnFirst == kNothing ? 0 : static_cast<std::uint32_t>(nLast - mnFirst + 1);
-        const std::int64_t nEnd = nStart + nTotal;
-        mnInsideBegin = static_cast<std::uint32_t>(std::clamp<std::int64_t>(-nStart, 0, nTotal));
-        mnInsideEnd = static_cast<std::uint32_t>(std::clamp<std::int64_t>(
-            nTotal - (nEnd - std::int64_t{nImage}), mnInsideBegin, nTotal));
+        // Those in the image show themselves: only the first and last have to be looked at.
+        TakeShown(0, mnInsideBegin);
+        TakeShown(mnInsideBegin, std::min(mnInsideBegin + 1, mnInsideEnd));
+        TakeShown(std::max(mnInsideEnd, mnInsideBegin + 1) - 1, mnInsideEnd);
+        TakeShown(mnInsideEnd, mnTotal);
     }
 
-    std::uint32_t Total() const { return static_cast<std::uint32_t>(mvnShown.size()); }
+    std::uint32_t Total() const { return mnTotal; }
     std::uint32_t First() const { return static_cast<std::uint32_t>(mnFirst); }
-    std::uint32_t Count() const { return mnCount; }
+    std::uint32_t Count() const
+    {
+        return mnFirst == kNothing ? 0 : static_cast<std::uint32_t>(mnLast - mnFirst + 1);
+    }
     /// The columns that lie in the image.
     std::uint32_t InsideBegin() const { return mnInsideBegin; }
     std::uint32_t InsideEnd() const { return mnInsideEnd; }
     /// True when the columns in the image show all that the others show as well.
-    bool InsideShowsAll() const { return mnInsideEnd - mnInsideBegin == mnCount; }
+    bool InsideShowsAll() const { return mnInsideEnd - mnInsideBegin == Count(); }
     /// What column i shows, counted from First(); kNothing for a zero.
     std::int64_t Shown(std::uint32_t i) const
     {
-        return mvnShown[i] == kNothing ? kNothing : mvnShown[i] - mnFirst;
+        const std::int64_t nShown = ShownPosition(mnStart + i, mnImage, mnEdgeMode);
+        return nShown == kNothing ? kNothing : nShown - mnFirst;
     }
 
 private:
-    std::vector<std::int64_t> mvnShown;
-    std::int64_t mnFirst = kNothing;
-    std::uint32_t mnCount = 0;
-    std::uint32_t mnInsideBegin = 0;
-    std::uint32_t mnInsideEnd = 0;
+    void TakeShown(std::uint32_t nBegin, std::uint32_t nEnd)
+    {
+        for (std::uint32_t i = nBegin; i < nEnd; ++i)
+        {
+            const std::int64_t nShown = ShownPosition(mnStart + i, mnImage, mnEdgeMode);
+            if (nShown != kNothing)
+            {
+                mnFirst = mnFirst == kNothing ? nShown : std::min(mnFirst, nShown);
+                mnLast = std::max(mnLast, nShown);
+            }
+        }
+    }
+
+    std::int64_t mnStart;  ///< the position of column 0
+    std::int64_t mnImage;
+    int mnEdgeMode;
+    std::uint32_t mnTotal;
+    std::uint32_t mnInsideBegin;
+    std::uint32_t mnInsideEnd;
+    std::int64_t mnFirst = kNothing;  ///< of those shown
+    std::int64_t mnLast = kNothing;
 };
 
 /// Samples of a rectangle in memory, the channels of a pixel side by side.
