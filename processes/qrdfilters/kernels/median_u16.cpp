@@ -1,0 +1,37 @@
+#include "processes/qrdfilters/kernels/targets.h"
+
+#undef HWY_TARGET_INCLUDE
+#define HWY_TARGET_INCLUDE "processes/qrdfilters/kernels/median_u16.cpp"
+#include "hwy/foreach_target.h"
+#include "processes/qrdfilters/kernels/median-inl.h"
+
+HWY_BEFORE_NAMESPACE();
+
+namespace kor::filters::kernels::HWY_NAMESPACE
+{
+
+void SelectMediansU16(std::size_t nSide, const MedianBlock<std::uint16_t>& oBlock)
+{
+    SelectMediansOf(nSide, oBlock);
+}
+
+}  // namespace kor::filters::kernels::HWY_NAMESPACE
+
+HWY_AFTER_NAMESPACE();
+
+#if HWY_ONCE
+
+namespace kor::filters::kernels
+{
+
+HWY_EXPORT(SelectMediansU16);
+
+template <>
+void SelectMedians(std::size_t nSide, const MedianBlock<std::uint16_t>& oBlock)
+{
+    HWY_DYNAMIC_DISPATCH(SelectMediansU16)(nSide, oBlock);
+}
+
+}  // namespace kor::filters::kernels
+
+#endif
