@@ -39,10 +39,12 @@ public:
     const ogc::cs::GeocodingInfo& GetGeocodingInfo() const override;
     AuxiliaryData GetAuxiliaryData() const override;
 
-private:
+protected:
+    /// Over poOwned, or where that is null over poDataset.
     BasicReader(std::unique_ptr<IDataset> poOwned, IDataset* poDataset,
                 const std::vector<unsigned int>& oChannels);
 
+private:
     std::unique_ptr<IDataset> mpoOwned;  ///< null where the dataset is the caller's
     ChannelSet moSet;
     tessel::DataType moType;

@@ -1,15 +1,34 @@
 #include "platform/datasources/basicwriter.h"
 
+#include "platform/datasources/bitmapchannel.h"
 #include "platform/datasources/blocktransfer.h"
 #include "platform/datasources/guard.h"
 
 namespace kor::datasources
 {
 
-BasicWriter::BasicWriter(IRasterDataset* poDataset, const std::vector<unsigned int>& oChannels)
-    : moSet(poDataset, oChannels, true), moType(moSet.GetCommonType())
+BasicWriter::BasicWriter(std::unique_ptr<IRasterDataset> poOwned, IRasterDataset* poDataset,
+                         const std::vector<unsigned int>& oChannels)
+    : mpoOwned(std::move(poOwned)),
+      moSet(mpoOwned ? mpoOwned.get() : poDataset, oChannels, true),
+      moType(moSet.GetCommonType())
 {
     SetTileSize(moSet.GetDataset().GetTileWidth(), moSet.GetDataset().GetTileHeight());
+}
+
+BasicWriter::BasicWriter(IRasterDataset* poDataset, const std::vector<unsigned int>& oChannels)
+    : BasicWriter(nullptr, poDataset, oChannels)
+{
+}
+
+BasicWriter::BasicWriter(IRasterDataset* poDataset, std::initializer_list<unsigned int> oChannels)
+    : BasicWriter(poDataset, std::vector<unsigned int>(oChannels))
+{
+}
+
+BasicWriter::BasicWriter(IBitmapDataset* poDataset, unsigned int nBitmap)
+    : BasicWriter(std::make_unique<BitmapChannel>(poDataset, nBitmap), nullptr, {1})
+{
 }
 
 unsigned int BasicWriter::GetWidth() const

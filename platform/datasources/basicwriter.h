@@ -1,8 +1,11 @@
 #pragma once
 
+#include <initializer_list>
+#include <memory>
 #include <vector>
 
 #include "platform/datasources/channelset.h"
+#include "platform/datasources/ibitmapdataset.h"
 #include "platform/datasources/irasterwriter.h"
 
 namespace kor::datasources
@@ -11,11 +14,12 @@ namespace kor::datasources
 /// Writes channels of one type into a dataset, and reads them back.
 ///
 /// An eDT_BIT raster is taken packed, the first pixel in the most significant bit, without gaps
-/// between rows.
+/// between rows. A bitmap takes and gives rasters of eDT_8U: written, 0 or not 0, read, 0 or 1; its
+/// auxiliary data are those of channel 1.
 ///
-/// Errors   the constructor throws kor::DataException when the channels have different types or the
-///          list is empty, kor::IOException when a channel does not exist or the dataset was opened
-///          for reading.
+/// Errors   the constructors throw kor::DataException when the channels have different types or the
+///          list is empty, kor::IOException when a channel or bitmap does not exist or the dataset
+///          was opened for reading.
 /// Threads  one writer serves one thread at a time; several writers and readers over one dataset
 ///          may work at once, on different channels or blocks.
 class BasicWriter : public IRasterWriter
@@ -24,6 +28,11 @@ public:
     /// oChannels: channel numbers from 1, in the order in which the rasters hold them. Borrows the
     /// dataset.
     BasicWriter(IRasterDataset* poDataset, const std::vector<unsigned int>& oChannels);
+    /// The same for a list in braces, which would otherwise count as the number of a bitmap where
+    /// the dataset is known to have both: BasicWriter(poKordsk, {1}).
+    BasicWriter(IRasterDataset* poDataset, std::initializer_list<unsigned int> oChannels);
+    /// nBitmap: number of the bitmap from 1. Borrows the dataset.
+    BasicWriter(IBitmapDataset* poDataset, unsigned int nBitmap);
 
     unsigned int GetWidth() const override;
     unsigned int GetHeight() const override;
@@ -37,6 +46,10 @@ public:
     void Flush() override;
 
 private:
+    BasicWriter(std::unique_ptr<IRasterDataset> poOwned, IRasterDataset* poDataset,
+                const std::vector<unsigned int>& oChannels);
+
+    std::unique_ptr<IRasterDataset> mpoOwned;  ///< null where the dataset is the caller's
     ChannelSet moSet;
     tessel::DataType moType;
 };

@@ -4,6 +4,7 @@
 #include <system_error>
 
 #include "platform/datasources/guard.h"
+#include "platform/datasources/kordsk/kordskdriver.h"
 #include "platform/fileio/file.h"
 
 namespace kor::datasources
@@ -75,6 +76,11 @@ std::string NamesOf(const std::vector<std::shared_ptr<IDatasetDriver>>& vpoDrive
 }
 
 }  // namespace
+
+DatasetManager::DatasetManager()
+{
+    mvpoDrivers.push_back(MakeKordskDriver());
+}
 
 DatasetManager* DatasetManager::GetInstance()
 {

@@ -10,7 +10,7 @@
 namespace kor::datasources
 {
 
-/// Opens and makes datasets, by the drivers that it knows.
+/// Opens and makes datasets, by the drivers that it knows: that of KORDSK files from the start.
 ///
 /// Names are names of regular files. What is not one (a directory, a device, "/vsizip/...",
 /// "http://...", a text that describes a dataset) is refused before any driver sees it.
@@ -46,7 +46,7 @@ public:
     static void AllowDriver(const std::string& oFormat);
 
 private:
-    DatasetManager() = default;
+    DatasetManager();
 
     std::vector<std::shared_ptr<IDatasetDriver>> GetDrivers() const;
 
