@@ -59,7 +59,7 @@ void ForEachRowBand(std::uint32_t nRows, std::uint32_t nMostRows,
     const std::int64_t nBandRows = std::clamp<std::int64_t>(nShare, kBandStep, nMostRows);
     const std::int64_t nBands = (nRows + nBandRows - 1) / nBandRows;
     FirstError oError;
-#pragma omp parallel for schedule(static)
+#pragma omp parallel for schedule(static) if (nBands > 1)
     for (std::int64_t nBand = 0; nBand < nBands; ++nBand)
     {
         const std::int64_t nFirst = nBand * nBandRows;

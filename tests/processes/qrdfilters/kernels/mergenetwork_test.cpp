@@ -12,7 +12,7 @@ namespace
 
 /// The ranks that the network gives. Its steps do what they say and no more: a half that was left
 /// out leaves a value that fits nowhere.
-std::vector<int> Run(const Network& oNetwork, std::vector<int> vValues)
+std::vector<int> RanksGiven(const Network& oNetwork, std::vector<int> vValues)
 {
     constexpr int kUndefined = -1000;
     for (std::size_t i = 0; i < oNetwork.nExchanges; ++i)
@@ -63,7 +63,7 @@ TEST(SortNetwork, OrdersEveryListOfZerosAndOnes)
             {
                 vValues.push_back((nBits >> i) & 1U);
             }
-            const std::vector<int> vResult = Run(oNetwork, vValues);
+            const std::vector<int> vResult = RanksGiven(oNetwork, vValues);
             ASSERT_TRUE(std::is_sorted(vResult.begin(), vResult.end())) << nCount << " " << nBits;
             ASSERT_EQ(vResult.size(), nCount);
         }
@@ -80,16 +80,16 @@ TEST(SortNetwork, TakesTheKnownNumberOfSteps)
 
 TEST(MergeNetwork, GivesEveryRangeOfRanks)
 {
-    for (const auto [nA, nB] : {std::pair{1, 1},
-                                {3, 3},
-                                {5, 5},
-                                {10, 10},
-                                {7, 7},
-                                {14, 14},
-                                {22, 14},
-                                {1, 6},
-                                {4, 0},
-                                {0, 4}})
+    for (const auto& [nA, nB] : {std::pair{1, 1},
+                                 {3, 3},
+                                 {5, 5},
+                                 {10, 10},
+                                 {7, 7},
+                                 {14, 14},
+                                 {22, 14},
+                                 {1, 6},
+                                 {4, 0},
+                                 {0, 4}})
     {
         const auto a = static_cast<std::size_t>(nA);
         const auto b = static_cast<std::size_t>(nB);
@@ -104,7 +104,7 @@ TEST(MergeNetwork, GivesEveryRangeOfRanks)
                 vValues.insert(vValues.end(), vB.begin(), vB.end());
                 std::vector<int> vExpected = vValues;
                 std::sort(vExpected.begin(), vExpected.end());
-                ASSERT_EQ(Run(oNetwork, vValues),
+                ASSERT_EQ(RanksGiven(oNetwork, vValues),
                           std::vector<int>(vExpected.begin() + static_cast<std::ptrdiff_t>(nFirst),
                                            vExpected.begin() + static_cast<std::ptrdiff_t>(nEnd)))
                     << a << " and " << b << " from " << nFirst << ", " << nZeros;
