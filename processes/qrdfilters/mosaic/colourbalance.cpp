@@ -4,18 +4,19 @@
 #include <cmath>
 #include <vector>
 
+#include "processes/qrdfilters/mosaic/ascending.h"
+
 namespace kor::filters
 {
 
 namespace
 {
 
-/// The upper one of the two in the middle where the count is even; not a number comes last.
+/// The upper one of the two in the middle where the count is even.
 double Median(std::vector<double>& vdfValues)
 {
     const auto itMiddle = vdfValues.begin() + static_cast<std::ptrdiff_t>(vdfValues.size() / 2);
-    std::nth_element(vdfValues.begin(), itMiddle, vdfValues.end(),
-                     [](double a, double b) { return a < b || (std::isnan(b) && !std::isnan(a)); });
+    std::nth_element(vdfValues.begin(), itMiddle, vdfValues.end(), Ascending());
     return *itMiddle;
 }
 

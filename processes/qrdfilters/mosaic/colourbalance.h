@@ -14,7 +14,7 @@ struct BalanceLine
 
 /// The line through pairs of samples: the medians of the slopes and of the intercepts that pairs
 /// with different inputs have. Pairs are taken in steps that leave about ten thousand of them. Both
-/// lists have the same length. A slope that is not a number counts as greatest.
+/// lists have the same length.
 BalanceLine LineOfPairs(const ISampleList& oIn, const ISampleList& oOut);
 
 /// The line that maps a low and a high sample of the input to those of the output. The low one has

@@ -5,6 +5,7 @@
 #include <optional>
 #include <vector>
 
+#include "processes/qrdfilters/mosaic/ascending.h"
 #include "processes/qrdfilters/sampleconversion.h"
 
 namespace kor::filters
@@ -49,17 +50,6 @@ T MeanOfFour(T a, T b, T c, T d)
                           static_cast<uint64>(d);
         return static_cast<T>(static_cast<Sum>(nSum) / 4);
     }
-}
-
-/// An order also for samples that are not numbers: these come last.
-template <class T>
-bool IsLess(T a, T b)
-{
-    if constexpr (std::is_floating_point_v<T>)
-    {
-        return a < b || (std::isnan(b) && !std::isnan(a));
-    }
-    return a < b;
 }
 
 /// T is an arithmetic type: signed char for samples of type char.
@@ -148,7 +138,7 @@ public:
     double TakeRanked(std::size_t nRank) override
     {
         const auto itRank = mvSamples.begin() + static_cast<std::ptrdiff_t>(nRank);
-        std::nth_element(mvSamples.begin(), itRank, mvSamples.end(), IsLess<T>);
+        std::nth_element(mvSamples.begin(), itRank, mvSamples.end(), Ascending());
         return ConvertSample<T, double>(*itRank);
     }
 

@@ -62,8 +62,8 @@ public:
     /// True when two samples differ, which 64-bit ones may do that are equal as double.
     virtual bool Differ(std::size_t i, std::size_t j) const = 0;
     virtual SampleRange GetRange() const = 0;
-    /// Sample number nRank in ascending order, counted from 0, not a number behind all others. Puts
-    /// the list in another order.
+    /// Sample number nRank in ascending order, counted from 0 (see Ascending). Puts the list in
+    /// another order.
     virtual double TakeRanked(std::size_t nRank) = 0;
 };
 

@@ -92,6 +92,8 @@ ExtendedDataCopy Balanced(int nMode)
     ExtendedDataCopy oCopy;
     oCopy.SetBalanceMode(nMode);
     oCopy.SetSampleBand(100);
+    oCopy.SetInputNoData(-9999);
+    oCopy.SetOutputNoData(-9999);
     return oCopy;
 }
 
@@ -567,6 +569,14 @@ int StepsToValid(const Mask* poMask, const Raster& oBlock, std::int64_t x, std::
     return static_cast<int>(nSteps);
 }
 
+/// Sorts numbers, of zeros the negative ones first.
+void Sort(std::vector<double>& vdfValues)
+{
+    std::sort(vdfValues.begin(), vdfValues.end(),
+              [](double a, double b)
+              { return a < b || (a == b && std::signbit(a) > std::signbit(b)); });
+}
+
 /// The copy, told in plain loops on doubles.
 class MosaicByDefinition
 {
@@ -667,8 +677,8 @@ private:
         }
         if (!vdfSlopes.empty())
         {
-            std::sort(vdfSlopes.begin(), vdfSlopes.end());
-            std::sort(vdfIntercepts.begin(), vdfIntercepts.end());
+            Sort(vdfSlopes);
+            Sort(vdfIntercepts);
             g = vdfSlopes[vdfSlopes.size() / 2];
             o = vdfIntercepts[vdfIntercepts.size() / 2];
         }
@@ -676,8 +686,8 @@ private:
 
     void PercentileLine(double& g, double& o)
     {
-        std::sort(mvdfIn.begin(), mvdfIn.end());
-        std::sort(mvdfOut.begin(), mvdfOut.end());
+        Sort(mvdfIn);
+        Sort(mvdfOut);
         const auto n = static_cast<double>(mvdfIn.size());
         const auto l = static_cast<std::size_t>(n * s.dfLow);
         const auto h = mvdfIn.size() - 1 - static_cast<std::size_t>(n * s.dfHigh);
@@ -783,7 +793,8 @@ TEST(ExtendedDataCopy, DoesAsItsDefinitionOnAllPairsOfTypes)
             oCopy.ProcessBlock(poIn.get(), poOut.get());
             oDefinition.FindGain();
             oDefinition.Apply(*poIn, oClip.moMask.get(), *poExpected);
-            ASSERT_TRUE(test::SameSample(oCopy.GetGain(), oDefinition.mdfGain));
+            ASSERT_TRUE(test::SameSample(oCopy.GetGain(), oDefinition.mdfGain))
+                << oCopy.GetGain() << " and not " << oDefinition.mdfGain;
             ASSERT_TRUE(test::SameSample(oCopy.GetOffset(), oDefinition.mdfOffset));
             ASSERT_TRUE(SameBits(*poOut, *poExpected));
         }

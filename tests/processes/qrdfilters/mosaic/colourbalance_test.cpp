@@ -81,6 +81,14 @@ TEST(ColourBalance, RanksSlopesThatAreNotANumberLast)
                3, 1);
 }
 
+// Slopes -0, 0, -0 and 0, of which number 2 in ascending order is 0.
+TEST(ColourBalance, TakesNegativeZerosAsSmaller)
+{
+    const BalanceLine oLine = LineOfPairs(*ListOf<double>({0, 1, 2}), *ListOf<double>({5, 5, 5}));
+    EXPECT_EQ(oLine.mdfGain, 0);
+    EXPECT_FALSE(std::signbit(oLine.mdfGain));
+}
+
 // Sorted 0 1 2 4 and 4 4 10 20. One sample lies below the low one and one above the high one:
 // (1, 4) and (2, 10).
 TEST(ColourBalance, MatchesPercentiles)
