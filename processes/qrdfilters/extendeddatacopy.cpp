@@ -1,6 +1,7 @@
 #include <memory>
 
 #include "basic/core/typedispatch/extendtypedispatch.h"
+#include "processes/qrdfilters/blockcontract.h"
 #include "processes/qrdfilters/datacopy.h"
 #include "processes/qrdfilters/hardened.h"
 #include "processes/qrdfilters/mosaic/clipdistance.h"

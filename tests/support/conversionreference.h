@@ -48,6 +48,16 @@ Row ReferenceConversion(std::size_t nIn, std::size_t nOut);
 /// nCount sums of squares of nCount pairs.
 Row ReferenceIntensity(std::size_t nIn, std::size_t nOut);
 
+/// One sample converted.
+template <class TIn, class TOut>
+TOut ReferenceSample(TIn xIn)
+{
+    TOut xOut{};
+    ReferenceConversion(typedispatch::ElementPosition<TIn>(),
+                        typedispatch::ElementPosition<TOut>())(&xIn, &xOut, 1);
+    return xOut;
+}
+
 /// nCount elements of type nOut that a row function makes of oIn.
 Elements Converted(Row pfnRow, const Elements& oIn, std::size_t nOut, std::size_t nCount);
 

@@ -83,11 +83,20 @@ void RowWriter::WritePart(const unsigned char* pIn, unsigned char* pOut,
 /// By the distance, and by the input's "no data".
 void RowWriter::FindFates(const unsigned char* pIn, std::span<const std::uint32_t> oDistances)
 {
-    auto itFate = mvnFates.begin();
-    for (const std::int64_t d : oDistances)
+    const auto oFate = [nWidth = std::int64_t{moRules.mnBlendWidth}](std::int64_t d) {
+        return d == 0 ? kReplace : d < nWidth ? kBlend : kKeep;
+    };
+    if (mnChannels == 1)
     {
-        const unsigned char nOutside = d < moRules.mnBlendWidth ? kBlend : kKeep;
-        itFate = std::fill_n(itFate, mnChannels, d == 0 ? kReplace : nOutside);
+        std::transform(oDistances.begin(), oDistances.end(), mvnFates.begin(), oFate);
+    }
+    else
+    {
+        auto itFate = mvnFates.begin();
+        for (const std::uint32_t d : oDistances)
+        {
+            itFate = std::fill_n(itFate, mnChannels, oFate(d));
+        }
     }
     if (moRules.mfInputNoData)
     {

@@ -221,7 +221,10 @@ TEST(QRDDataCopy, CopiesAllPairsOfTypesByTheDefinition)
             }
         }
     };
-    test::ForEachTypePair(oPair);
+    test::ForEachElementType(
+        [&]<class TIn>() {
+            test::ForEachElementType([&]<class TOut>() { oPair.template operator()<TIn, TOut>(); });
+        });
 }
 
 TEST(QRDDataCopy, CopiesTheSameOnAnyNumberOfThreads)

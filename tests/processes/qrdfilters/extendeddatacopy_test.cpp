@@ -799,7 +799,10 @@ TEST(ExtendedDataCopy, DoesAsItsDefinitionOnAllPairsOfTypes)
             ASSERT_TRUE(SameBits(*poOut, *poExpected));
         }
     };
-    test::ForEachTypePair(oPair);
+    test::ForEachElementType(
+        [&]<class TIn>() {
+            test::ForEachElementType([&]<class TOut>() { oPair.template operator()<TIn, TOut>(); });
+        });
 }
 
 // 1500 samples a row, more than are worked on together, and rows for several threads.
