@@ -56,7 +56,7 @@ install_packages() # GROUP...
         return
     fi
     echo "Missing: $missing"
-    local command="apt-get install --no-install-recommends $missing"
+    local command="apt-get update && apt-get install --no-install-recommends ${missing% }"
     if [ "$(id -u)" != 0 ] && ! command -v sudo >/dev/null; then
         fail "These packages are missing, and installing them takes root:" "    $command"
     fi
