@@ -7,6 +7,7 @@
 
 #include "basic/core/typedispatch/extendtypedispatch.h"
 #include "processes/qrdfilters/background.h"
+#include "processes/qrdfilters/blockcontract.h"
 #include "processes/qrdfilters/medianselection.h"
 #include "processes/qrdfilters/rowbands.h"
 #include "processes/qrdfilters/samplerows.h"

@@ -5,6 +5,8 @@
 #include <type_traits>
 #include <vector>
 
+#include "basic/core/typedispatch/typelist.h"
+#include "processes/qrdfilters/blockcontract.h"
 #include "processes/qrdfilters/engine/outputrows.h"
 #include "processes/qrdfilters/engine/windowrows.h"
 #include "processes/qrdfilters/engine/windowsums.h"
@@ -20,6 +22,8 @@ using engine::TermSums;
 using engine::ValidRows;
 using kernels::kBatchRows;
 using kernels::PadRow;
+
+constexpr const char* kSource = "processes/qrdfilters/slidingwindow";
 
 /// One run of the engine over a block.
 template <class TSample>
@@ -193,6 +197,8 @@ template <class TSample>
 void ScanWindows(const tessel::Raster& oIn, const tessel::Mask* poMaskIn, const Window& oWindow,
                  std::span<const WindowTerm> oTerms, const VisitWindows& oVisit)
 {
+    RequireType(oIn, typedispatch::RealDataType<TSample>(), "poRasterIn", kSource);
+    RequireWindowInside(oWindow, oIn, poMaskIn, kSource);
     if (oIn.mnWidth == 0 || oIn.mnHeight == 0 || oIn.mnChannels == 0)
     {
         return;
@@ -206,6 +212,8 @@ void FilterWindowRows(const tessel::Raster& oIn, const tessel::Mask* poMaskIn,
                       const FinishWindows& oFinish, tessel::Raster& oOut,
                       const tessel::Mask* poMaskOut)
 {
+    RequireType(oOut, typedispatch::RealDataType<TSample>(), "poRasterOut", kSource);
+    RequireMatchingBlocks(oIn, nullptr, oOut, poMaskOut, kSource);
     engine::OutputRows<TSample> oRows(oIn, poMaskIn, bBGZero, oFinish, oOut, poMaskOut);
     ScanWindows<TSample>(oIn, poMaskIn, oWindow, oTerms,
                          [&oRows](const WindowStatistics& oStatistics)

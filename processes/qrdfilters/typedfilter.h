@@ -23,14 +23,6 @@ void RequireRasters(const tessel::Raster* poRasterIn, const tessel::Raster* poRa
 void RequireRealOutput(const tessel::Raster& oRasterOut, const char* pszSource,
                        const std::source_location& oWhere = std::source_location::current());
 
-/// In hardened builds: throws kor::Exception when the output differs from the input in width,
-/// height or channels, when the input mask has not the geometry of the input raster, or when the
-/// output mask has another width or height. The masks may be null. Other builds trust the caller.
-void RequireMatchingBlocks(const tessel::Raster& oRasterIn, const tessel::Mask* poMaskIn,
-                           const tessel::Raster& oRasterOut, const tessel::Mask* poMaskOut,
-                           const char* pszSource,
-                           const std::source_location& oWhere = std::source_location::current());
-
 /// The block that a filter reads: the caller's raster, or where that is complex a real raster of
 /// the same geometry made of it (its magnitude), which lives as long as this object.
 class RealInput

@@ -5,7 +5,6 @@
 #include <string>
 
 #include "platform/exception/exception.h"
-#include "processes/qrdfilters/hardened.h"
 #include "processes/qrdfilters/iprocessor.h"
 #include "tests/support/blocks.h"
 
@@ -80,50 +79,6 @@ TEST(RequireRealOutput, ReportsAComplexOutputAlone)
     const Exception oException = ThrownBy([&] { RequireRealOutput(*poComplex, kSource); });
     EXPECT_EQ(oException.GetMessage(), "Output cannot be complex");
     EXPECT_EQ(oException.GetFile(), kSource);
-}
-
-/// The message about these blocks; empty when there is none, as in every build that trusts callers.
-std::string Mismatch(const tessel::Raster& oIn, const tessel::Mask* poMaskIn,
-                     const tessel::Raster& oOut, const tessel::Mask* poMaskOut)
-{
-    try
-    {
-        RequireMatchingBlocks(oIn, poMaskIn, oOut, poMaskOut, kSource);
-    }
-    catch (const Exception& oException)
-    {
-        return oException.GetMessage();
-    }
-    return "";
-}
-
-std::string InHardenedBuilds(const std::string& oMessage)
-{
-    return kHardened ? oMessage : "";
-}
-
-TEST(RequireMatchingBlocks, LooksAtWhatFiltersRelyOn)
-{
-    Random oRandom(1);
-    const auto poIn = BlankRaster(4, 3, 2, eDT_8U, Margins{1, 2});
-    const auto poMaskIn = RandomMask(4, 3, Margins{1, 2}, 0.5, oRandom);
-    const auto poMaskOut = RandomMask(4, 3, Margins{5, 0}, 0.5, oRandom);
-    const auto poOut = BlankRaster(4, 3, 2, eDT_32R, Margins{3, 0});
-    EXPECT_EQ(Mismatch(*poIn, poMaskIn.get(), *poOut, poMaskOut.get()), "");
-    EXPECT_EQ(Mismatch(*poIn, nullptr, *poOut, nullptr), "");
-
-    EXPECT_EQ(Mismatch(*poIn, nullptr, *BlankRaster(4, 2, 2, eDT_8U), nullptr),
-              InHardenedBuilds("poRasterOut has 4 x 2 pixels, poRasterIn 4 x 3 pixels"));
-    EXPECT_EQ(Mismatch(*poIn, nullptr, *BlankRaster(5, 3, 2, eDT_8U), nullptr),
-              InHardenedBuilds("poRasterOut has 5 x 3 pixels, poRasterIn 4 x 3 pixels"));
-    EXPECT_EQ(Mismatch(*poIn, nullptr, *BlankRaster(4, 3, 1, eDT_8U), nullptr),
-              InHardenedBuilds("poRasterOut has 1 channels, poRasterIn 2"));
-    EXPECT_EQ(Mismatch(*poIn, poMaskOut.get(), *poOut, nullptr),
-              InHardenedBuilds("poMaskIn has 4 x 3 pixels with margins 5 and 0, poRasterIn 4 x 3 "
-                               "pixels with margins 1 and 2"));
-    const auto poNarrow = RandomMask(3, 3, Margins{1, 2}, 0.5, oRandom);
-    EXPECT_EQ(Mismatch(*poIn, nullptr, *poOut, poNarrow.get()),
-              InHardenedBuilds("poMaskOut has 3 x 3 pixels, poRasterIn 4 x 3 pixels"));
 }
 
 TEST(RealInput, LeavesARealRasterAlone)
