@@ -10,15 +10,12 @@
 
 #include <algorithm>
 #include <chrono>
-#include <cmath>
 #include <cstdint>
 #include <cstdio>
 #include <filesystem>
 #include <iostream>
 #include <memory>
 #include <numeric>
-#include <optional>
-#include <sstream>
 #include <stdexcept>
 #include <string>
 #include <system_error>
@@ -37,12 +34,12 @@
 #include "processes/qrdfilters/convertraster.h"
 #include "processes/qrdfilters/filteraverage.h"
 #include "processes/qrdfilters/filtermedian.h"
+#include "processes/qrdfilters/validmaskbuilder.h"
 
 namespace
 {
 
 using namespace kor;
-using datasources::AuxiliaryData;
 using examples::Picture;
 using tessel::Mask;
 using tessel::Raster;
@@ -119,6 +116,20 @@ public:
         return {moReader.GetWidth(), moReader.GetHeight(), moReader.GetChannelCount(), moType};
     }
     const datasources::BasicReader& GetReader() const { return moReader; }
+    /// The values that the file names for missing data, of whichever channel.
+    std::vector<double> GetNoData() const
+    {
+        const datasources::AuxiliaryData oData = moReader.GetAuxiliaryData();
+        std::vector<double> vdfNoData;
+        for (const auto& [nChannel, oChannel] : oData.GetChannels())
+        {
+            if (oChannel.mdfNoData)
+            {
+                vdfNoData.push_back(*oChannel.mdfNoData);
+            }
+        }
+        return vdfNoData;
+    }
 
 private:
     static unsigned int CountChannels(const datasources::IDataset& oDataset,
@@ -135,74 +146,6 @@ private:
     std::unique_ptr<datasources::IDataset> mpoDataset;
     datasources::BasicReader moReader;
     tessel::DataType moType;
-};
-
-/// What makes a pixel invalid: a sample that is the channel's no-data value or is not finite.
-class Validity
-{
-public:
-    explicit Validity(const Source& oSource) : mbNeeded(oSource.GetInfo().moDataType.mbFloat)
-    {
-        const AuxiliaryData oData = oSource.GetReader().GetAuxiliaryData();
-        for (unsigned int c = 1; c <= oSource.GetInfo().mnChannels; ++c)
-        {
-            std::optional<double> dfNoData = oData.GetChannelNoData(c);
-            if (dfNoData && oSource.GetInfo().moDataType == tessel::eDT_32R)
-            {
-                dfNoData = static_cast<float>(*dfNoData);  // as the samples have it
-            }
-            mbNeeded = mbNeeded || dfNoData;
-            mvdfNoData.push_back(dfNoData);
-        }
-    }
-
-    /// The mask of a strip of doubles, or null where every pixel is valid by its type.
-    std::unique_ptr<Mask> BuildMask(const Raster& oStrip) const
-    {
-        if (!mbNeeded)
-        {
-            return nullptr;
-        }
-        const auto* pSample = reinterpret_cast<const double*>(oStrip.mpBuffer);
-        std::vector<unsigned char> vnValid(std::size_t{oStrip.mnTotalWidth} * oStrip.mnTotalHeight);
-        for (unsigned char& nValid : vnValid)
-        {
-            nValid = IsValid(pSample) ? 1 : 0;
-            pSample += mvdfNoData.size();
-        }
-        return std::make_unique<Mask>(RasterInfo(oStrip), RasterContext(oStrip), vnValid.data(),
-                                      false, false);
-    }
-
-    std::string Describe() const
-    {
-        if (mvdfNoData.front())
-        {
-            std::ostringstream oText;
-            oText << *mvdfNoData.front()
-                  << ": pixels with it in any channel enter no window and stay as they are";
-            return oText.str();
-        }
-        return mbNeeded ? "no value named; only samples that are not finite are masked"
-                        : "no value named, so every pixel counts";
-    }
-
-private:
-    bool IsValid(const double* pPixel) const
-    {
-        for (const std::optional<double>& dfNoData : mvdfNoData)
-        {
-            if (!std::isfinite(*pPixel) || dfNoData == *pPixel)
-            {
-                return false;
-            }
-            ++pPixel;
-        }
-        return true;
-    }
-
-    std::vector<std::optional<double>> mvdfNoData;  ///< one a channel
-    bool mbNeeded;
 };
 
 /// A GeoTIFF that comes under its name only when it is complete.
@@ -325,7 +268,7 @@ std::string SystemName(const std::string& oWkt)
                                        : oWkt.substr(nOpen + 1, nClose - nOpen - 1);
 }
 
-void ReportSource(const std::string& oFile, const Source& oSource, const Validity& oValidity)
+void ReportSource(const std::string& oFile, const Source& oSource)
 {
     const datasources::BasicReader& oReader = oSource.GetReader();
     const ogc::cs::GeocodingInfo& oPlace = oReader.GetGeocodingInfo();
@@ -336,15 +279,24 @@ void ReportSource(const std::string& oFile, const Source& oSource, const Validit
     std::printf("%-14s%s; corner at %.12g, %.12g; a pixel is %.6g by %.6g\n", "georeference",
                 SystemName(oPlace.GetProjection()).c_str(), oPlace.GetXOffset(),
                 oPlace.GetYOffset(), oPlace.GetXPerCol(), oPlace.GetYPerRow());
-    std::printf("%-14s%s\n", "no data", oValidity.Describe().c_str());
+    const std::vector<double> vdfNoData = oSource.GetNoData();
+    if (vdfNoData.empty())
+    {
+        std::printf("%-14s%s\n", "no data",
+                    oSource.GetInfo().moDataType.mbFloat
+                        ? "no value named; only samples that are not finite are masked"
+                        : "no value named, so every pixel counts");
+        return;
+    }
+    std::printf("%-14s%g: pixels with it in any channel enter no window and stay as they are\n",
+                "no data", vdfNoData.front());
 }
 
 void Smooth(const std::string& oFile, const std::filesystem::path& oFolder)
 {
     Source oSource(oFile);
-    const Validity oValidity(oSource);
     const RasterInfo oImage = oSource.GetInfo();
-    ReportSource(oFile, oSource, oValidity);
+    ReportSource(oFile, oSource);
 
     std::filesystem::create_directories(oFolder);
     Result oAverage(oFolder, "average", oSource);
@@ -353,13 +305,15 @@ void Smooth(const std::string& oFile, const std::filesystem::path& oFolder)
     const filters::FilterAverage oAverageFilter(false);  // masked pixels keep their values
     filters::FilterMedian oMedianFilter;
     oMedianFilter.SetBGZero(false);
+    const filters::ValidMaskBuilder oMaskBuilder(oSource.GetNoData());
+    const bool bMasked = oImage.moDataType.mbFloat || !oSource.GetNoData().empty();
 
     for (std::uint32_t y = 0; y < oImage.mnHeight; y += oSource.StripRows())
     {
         const auto poStrip =
             oSource.ReadStrip(y, std::min(oSource.StripRows(), oImage.mnHeight - y));
         const auto poDoubles = Converted(*poStrip, tessel::eDT_64R);
-        const auto poMask = oValidity.BuildMask(*poDoubles);
+        const std::unique_ptr<Mask> poMask(bMasked ? oMaskBuilder.BuildMask(*poStrip) : nullptr);
         oBefore.Add(*poDoubles, poMask.get());
 
         // The average works on doubles, the median on samples of any type.

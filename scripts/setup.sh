@@ -1,8 +1,10 @@
 # Sourced by check, demo and bench/run. Every package that the project needs is named here, once.
 
-PACKAGES_build="g++ cmake ninja-build libboost-dev libhwy-dev libgdal-dev"
-PACKAGES_test="libgtest-dev"
-PACKAGES_bench="libbenchmark-dev"
+declare -A PACKAGES=(
+    [build]="g++ cmake ninja-build libboost-dev libhwy-dev libgdal-dev"
+    [test]="libgtest-dev"
+    [bench]="libbenchmark-dev"
+)
 
 stage() # TEXT
 {
@@ -40,10 +42,9 @@ apt() # ARGUMENT...
 # Installs what is missing of the packages of some groups; asks apt for nothing when all is there.
 install_packages() # GROUP...
 {
-    local group list packages="" missing
+    local group packages="" missing
     for group in "$@"; do
-        list=PACKAGES_$group
-        packages+=" ${!list}"
+        packages+=" ${PACKAGES[$group]}"
     done
     if ! command -v dpkg-query >/dev/null; then
         echo "This system has no dpkg. Going on without; needed are what Debian calls:$packages"
@@ -56,7 +57,7 @@ install_packages() # GROUP...
         return
     fi
     echo "Missing: $missing"
-    local command="apt-get install --no-install-recommends $missing"
+    local command="apt-get update && apt-get install --no-install-recommends ${missing% }"
     if [ "$(id -u)" != 0 ] && ! command -v sudo >/dev/null; then
         fail "These packages are missing, and installing them takes root:" "    $command"
     fi
