@@ -5,8 +5,8 @@
 
 #include "basic/core/typedispatch/extendtypedispatch.h"
 #include "platform/exception/exception.h"
-#include "processes/qrdfilters/background.h"
 #include "processes/qrdfilters/blockcontract.h"
+#include "processes/qrdfilters/findbyte.h"
 #include "processes/qrdfilters/rowbands.h"
 #include "processes/qrdfilters/samplerows.h"
 

@@ -3,7 +3,7 @@
 #include <algorithm>
 #include <limits>
 
-#include "processes/qrdfilters/background.h"
+#include "processes/qrdfilters/findbyte.h"
 #include "processes/qrdfilters/samplerows.h"
 
 namespace kor::filters

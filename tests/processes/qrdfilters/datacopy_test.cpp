@@ -9,13 +9,13 @@
 #include "platform/datasources/basicreader.h"
 #include "platform/datasources/basicwriter.h"
 #include "platform/exception/exception.h"
-#include "platform/system/omp.h"
 #include "processes/qrdfilters/hardened.h"
 #include "processes/qrdfilters/parallelio/filteriodriver.h"
 #include "processes/qrdfilters/validmaskbuilder.h"
 #include "tests/support/conversionreference.h"
 #include "tests/support/exceptions.h"
 #include "tests/support/memorydataset.h"
+#include "tests/support/threads.h"
 
 namespace kor::filters
 {
@@ -237,7 +237,7 @@ TEST(QRDDataCopy, CopiesTheSameOnAnyNumberOfThreads)
     CopyByDefinition<unsigned short, unsigned char>(*poIn, poMask.get(), false, *poExpected);
     for (const int nThreads : {1, 2, 5})
     {
-        const OMPThreadCount oThreads(nThreads);
+        const test::ThreadCount oThreads(nThreads);
         const auto poOut = BlankRaster(13, 301, 2, tessel::eDT_8U);
         QRDDataCopy().Process(poIn.get(), poMask.get(), poOut.get());
         EXPECT_TRUE(SameBits(*poOut, *poExpected)) << nThreads << " threads";

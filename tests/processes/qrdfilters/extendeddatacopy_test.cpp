@@ -8,11 +8,11 @@
 #include <vector>
 
 #include "platform/exception/exception.h"
-#include "platform/system/omp.h"
 #include "processes/qrdfilters/datacopy.h"
 #include "processes/qrdfilters/hardened.h"
 #include "tests/support/conversionreference.h"
 #include "tests/support/exceptions.h"
+#include "tests/support/threads.h"
 
 namespace kor::filters
 {
@@ -819,7 +819,7 @@ TEST(ExtendedDataCopy, WritesTheSameOnAnyNumberOfThreads)
     oClip.moMask = test::RandomMask(500, 19, Margins{1, 1}, 0.2, oRandom);
     const auto oRun = [&](int nThreads)
     {
-        const OMPThreadCount oThreads(nThreads);
+        const test::ThreadCount oThreads(nThreads);
         ExtendedDataCopy oCopy = oSettings.MakeCopy();
         oCopy.SetClipBuilder(&oClip);
         auto poOut = BlankRaster(500, 19, 3, tessel::eDT_32R);

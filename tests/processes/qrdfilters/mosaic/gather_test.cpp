@@ -4,8 +4,8 @@
 
 #include <vector>
 
-#include "platform/system/omp.h"
 #include "tests/support/blocks.h"
+#include "tests/support/threads.h"
 
 namespace kor::filters
 {
@@ -110,7 +110,7 @@ TEST(Gather, SamplesComeInTheOrderOfTheRowsOnAnyNumberOfThreads)
     const ClipDistance oDistance(*poIn, poMask.get(), true);
     const auto oGather = [&](int nThreads)
     {
-        const OMPThreadCount oThreads(nThreads);
+        const test::ThreadCount oThreads(nThreads);
         Gathered oGathered{MakeSampleList<unsigned short>(), MakeSampleList<double>(), {}};
         GatherBlock(*poIn, *poOut, oDistance, kAll, oGathered);
         GatherBlock(*poIn, *poOut, oDistance, kAll, oGathered);
