@@ -113,7 +113,7 @@ std::shared_ptr<tessel::Raster> FilterAverage::operator()(
     std::shared_ptr<tessel::Raster> poRasterIn, std::shared_ptr<tessel::Mask> poMaskIn,
     std::shared_ptr<tessel::Mask> poMaskOut) const
 {
-    const auto poRasterOut = std::make_shared<tessel::Raster>(
+    auto poRasterOut = std::make_shared<tessel::Raster>(
         *poRasterIn, tessel::RasterContext(0, 0, poRasterIn->mnOffsetX, poRasterIn->mnOffsetY));
     ProcessBlock(poRasterIn.get(), poMaskIn.get(), poRasterOut.get(), poMaskOut.get());
     return poRasterOut;

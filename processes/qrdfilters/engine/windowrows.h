@@ -99,7 +99,7 @@ private:
 
     void MakeRow(std::int64_t y, std::span<double> vdfRow)
     {
-        const TSample* pIn = moIn.GetPixelAs<const TSample>(mnLeft, y);
+        const auto* pIn = moIn.GetPixelAs<const TSample>(mnLeft, y);
         if constexpr (std::is_same_v<TSample, double>)
         {
             if (mpfnTransform == nullptr)
