@@ -82,7 +82,7 @@ void PlainAverage(const Raster& oIn, const Mask* poMask, Raster& oOut)
     const std::int64_t nChannels = oIn.mnChannels;
     std::vector<Sums> vColumns(static_cast<std::size_t>((nWidth + 2 * nHalf) * nChannels));
     std::vector<Sums> vRunning(static_cast<std::size_t>(nChannels));
-    const auto oAdd = [&](std::int64_t x, std::int64_t y, double dfSign)
+    const auto oForSums = [&](std::int64_t x, std::int64_t y, const auto& oUpdate)
     {
         if (poMask == nullptr || IsValid(*poMask, x, y))
         {
@@ -90,16 +90,33 @@ void PlainAverage(const Raster& oIn, const Mask* poMask, Raster& oOut)
             Sums* pColumn = &vColumns[static_cast<std::size_t>((x + nHalf) * nChannels)];
             for (std::int64_t c = 0; c < nChannels; ++c)
             {
-                pColumn[c].mdfSum += dfSign * static_cast<double>(pIn[c]);
-                pColumn[c].mdfCount += dfSign;
+                oUpdate(pColumn[c], static_cast<double>(pIn[c]));
             }
         }
+    };
+    const auto oAdd = [&](std::int64_t x, std::int64_t y)
+    {
+        oForSums(x, y,
+                 [](Sums& oColumn, double dfSample)
+                 {
+                     oColumn.mdfSum += dfSample;
+                     oColumn.mdfCount += 1.0;
+                 });
+    };
+    const auto oSubtract = [&](std::int64_t x, std::int64_t y)
+    {
+        oForSums(x, y,
+                 [](Sums& oColumn, double dfSample)
+                 {
+                     oColumn.mdfSum -= dfSample;
+                     oColumn.mdfCount -= 1.0;
+                 });
     };
     for (std::int64_t y = -nHalf; y < nHalf; ++y)
     {
         for (std::int64_t x = -nHalf; x < nWidth + nHalf; ++x)
         {
-            oAdd(x, y, 1.0);
+            oAdd(x, y);
         }
     }
     for (std::int64_t y = 0; y < oIn.mnHeight; ++y)
@@ -108,9 +125,9 @@ void PlainAverage(const Raster& oIn, const Mask* poMask, Raster& oOut)
         {
             if (y > 0)
             {
-                oAdd(x, y - nHalf - 1, -1.0);
+                oSubtract(x, y - nHalf - 1);
             }
-            oAdd(x, y + nHalf, 1.0);
+            oAdd(x, y + nHalf);
         }
         std::fill(vRunning.begin(), vRunning.end(), Sums());
         for (std::int64_t x = -2 * nHalf; x < nWidth; ++x)

@@ -1,5 +1,7 @@
 #include "processes/qrdfilters/kernels/averagerow.h"
 
+#include "processes/qrdfilters/kernels/targets.h"
+
 #undef HWY_TARGET_INCLUDE
 #define HWY_TARGET_INCLUDE "processes/qrdfilters/kernels/averagerow.cpp"
 #include <hwy/foreach_target.h>

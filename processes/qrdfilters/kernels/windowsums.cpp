@@ -1,5 +1,7 @@
 #include "processes/qrdfilters/kernels/windowsums.h"
 
+#include "processes/qrdfilters/kernels/targets.h"
+
 #include <algorithm>
 #include <cstring>
 
