@@ -45,7 +45,9 @@ public:
         const std::lock_guard oLock(moMutex);
         if (!moError)
         {
-            moError = oError;
+            // what() and not the message: kinds of errors that keep their words elsewhere say them.
+            moError.emplace(oError.what(), oError.GetFile(), oError.GetFunction(),
+                            oError.GetLine());
         }
         mbRaised = true;
     }

@@ -416,6 +416,28 @@ TEST_F(FilterIODriverTest, ErrorsOfWritingEndTheRun)
     EXPECT_EQ(RowsWritten(), 9);
 }
 
+// Such an error says its words by what(); its message is empty.
+TEST_F(FilterIODriverTest, ErrorsKeepTheirWordsOnTheWay)
+{
+    moDriver.moOnBlock = [](auto*, auto*, auto*)
+    {
+        throw ParameterException("mnFilterSize", ParameterException::Type::eInvalidValue,
+                                 "The filter size was not set", "", "", "source", "function", 12);
+    };
+    try
+    {
+        moDriver.Run(&moReader, &moWriter);
+        FAIL() << "nothing was thrown";
+    }
+    catch (const Exception& oError)
+    {
+        EXPECT_EQ(oError.GetMessage(), "mnFilterSize: The filter size was not set");
+        EXPECT_EQ(oError.GetFile(), "source");
+        EXPECT_EQ(oError.GetFunction(), "function");
+        EXPECT_EQ(oError.GetLine(), 12U);
+    }
+}
+
 TEST_F(FilterIODriverTest, DriverRunsAgainAfterAnError)
 {
     moReader.mnFailAt = 3;
