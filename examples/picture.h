@@ -28,6 +28,9 @@ public:
     {
     }
 
+    /// One row and column of so many is taken.
+    std::uint32_t GetStep() const { return mnStep; }
+
     /// Takes its pixels out of the next strip, of doubles. Masked ones are not a number.
     void Add(const tessel::Raster& oStrip, const tessel::Mask* poMask)
     {

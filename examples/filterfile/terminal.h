@@ -1,0 +1,26 @@
+#pragma once
+
+#include "processes/qrdfilters/parallelio/filteriodriver.h"
+
+namespace kor::examples
+{
+
+/// From now on Ctrl-C and SIGTERM ask for an end, once; the second one ends the program at once.
+void CatchInterrupts();
+/// True when an end was asked for.
+bool IsInterrupted();
+
+/// Shows the progress of a run on standard error where that is a terminal, and ends the run when it
+/// is asked for.
+class TerminalStatus : public parallelio::DefaultUpdateStrategy
+{
+public:
+    ~TerminalStatus() override;
+    bool IsCancelled() override { return IsInterrupted(); }
+    void SetProgress(float fFraction) override;
+
+private:
+    int mnShown = -1;  ///< per cent
+};
+
+}  // namespace kor::examples
