@@ -5,6 +5,8 @@
 // The image goes through memory in blocks: the next one is read and the last one written while one
 // is filtered. OUT appears when it is complete, or not at all.
 
+#include <malloc.h>
+
 #include <chrono>
 #include <cmath>
 #include <cstdio>
@@ -271,6 +273,14 @@ void PrintReport(const std::string& oFilter, const RasterInfo& oIn, const Raster
         oTimes.mdfWrite, dfClosing);
 }
 
+/// Blocks go back to the system when they are freed: what the allocator of the C library keeps of
+/// them for its threads would come on top of the memory that the user grants.
+void KeepNoFreedBlocks()
+{
+    constexpr int kBlockBytes = 1 << 20;
+    mallopt(M_MMAP_THRESHOLD, kBlockBytes);
+}
+
 /// The shares of the memory that the user grants: most goes to blocks, the rest to the cache of
 /// GDAL, which would else grow with the machine's memory. Who sets GDAL_CACHEMAX keeps his cache.
 std::uint64_t SplitMemory(int nMegabytes)
@@ -341,6 +351,7 @@ int main(int nArguments, char* apszArguments[])
             return kMisused;
         }
         examples::CatchInterrupts();
+        KeepNoFreedBlocks();
         return FilterFile(oWords[1], oWords[2], oWords[3], Arguments(oWords.subspan(4)));
     }
     catch (const examples::UsageError& oError)

@@ -4,6 +4,7 @@ declare -A PACKAGES=(
     [build]="g++ cmake ninja-build libboost-dev libhwy-dev libgdal-dev"
     [test]="libgtest-dev"
     [bench]="libbenchmark-dev"
+    [files]="time gdal-bin"
 )
 
 stage() # TEXT

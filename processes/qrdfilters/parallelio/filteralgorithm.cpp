@@ -1,6 +1,7 @@
 #include "processes/qrdfilters/parallelio/filteralgorithm.h"
 
 #include <algorithm>
+#include <limits>
 #include <new>
 #include <string>
 #include <vector>
@@ -20,13 +21,6 @@ namespace
 {
 
 constexpr const char* kSource = "processes/qrdfilters/parallelio/filteralgorithm";
-
-std::unique_ptr<Raster> DoublesLike(const Raster& oRaster)
-{
-    return std::make_unique<Raster>(
-        RasterInfo(oRaster.mnWidth, oRaster.mnHeight, oRaster.mnChannels, tessel::eDT_64R),
-        tessel::RasterContext(oRaster));
-}
 
 /// A block seen as another one, which is made where it has to be and lives as long as this object.
 class BlockView
@@ -75,6 +69,29 @@ std::uint64_t BlockBytes(const datasources::IRasterAccess* poReader,
 }
 
 }  // namespace
+
+std::unique_ptr<Raster> FilterAlgorithm::Scratch::DoublesLike(const Raster& oRaster)
+{
+    const std::size_t nSamples =
+        std::size_t{oRaster.mnTotalWidth} * oRaster.mnTotalHeight * oRaster.mnChannels;
+    if (nSamples * sizeof(double) > std::numeric_limits<std::uint32_t>::max())
+    {
+        throw DataException("A block of " + std::to_string(nSamples) +
+                                " samples is too large to be converted to doubles: it would take "
+                                "4 GiB or more",
+                            kSource, __PRETTY_FUNCTION__, __LINE__);
+    }
+    if (mpSamples == nullptr || nSamples > mnSamples)
+    {
+        mpSamples.reset();
+        mnSamples = 0;
+        mpSamples.reset(new double[nSamples]);
+        mnSamples = nSamples;
+    }
+    return std::make_unique<Raster>(
+        RasterInfo(oRaster.mnWidth, oRaster.mnHeight, oRaster.mnChannels, tessel::eDT_64R),
+        tessel::RasterContext(oRaster), reinterpret_cast<unsigned char*>(mpSamples.get()), false);
+}
 
 const tessel::IMaskBuilder* FilterAlgorithm::GetMaskBuilder() const
 {
@@ -157,7 +174,7 @@ void FilterAlgorithm::FilterBlock(Raster* poIn, tessel::Mask* poMaskIn, Raster* 
     }
     if (oIn.Get()->moDataType != tessel::eDT_64R)
     {
-        auto poDoubles = DoublesLike(*oIn.Get());
+        auto poDoubles = mpoScratchIn->DoublesLike(*oIn.Get());
         filters::ConvertRaster(oIn.Get(), poDoubles.get());
         oIn.Replace(std::move(poDoubles));
     }
@@ -166,7 +183,7 @@ void FilterAlgorithm::FilterBlock(Raster* poIn, tessel::Mask* poMaskIn, Raster* 
         mfnFilter(oIn.Get(), poMaskIn, poOut, poMaskOut.get());
         return;
     }
-    const auto poDoubles = DoublesLike(*poOut);
+    const auto poDoubles = mpoScratchOut->DoublesLike(*poOut);
     mfnFilter(oIn.Get(), poMaskIn, poDoubles.get(), poMaskOut.get());
     filters::ConvertRaster(poDoubles.get(), poOut);
 }

@@ -65,7 +65,7 @@ concept BlockFilter =
 ///          with one mask gets that of the input.
 /// Errors   kor::Exception when the output cannot take doubles, or memory for a converted block is
 ///          short; what the filter throws. All before the block's output is written.
-/// Threads  one at a time. Copies share the filter.
+/// Threads  one at a time. Copies share the filter and the memory for converted blocks.
 class FilterAlgorithm
 {
 public:
@@ -140,6 +140,19 @@ private:
         };
     }
 
+    /// Memory for working copies, kept from block to block: new pages for each cost more than many
+    /// a filter.
+    class Scratch
+    {
+    public:
+        /// Doubles with the geometry of oRaster; their memory is lent until the next call.
+        std::unique_ptr<tessel::Raster> DoublesLike(const tessel::Raster& oRaster);
+
+    private:
+        std::unique_ptr<double[]> mpSamples;
+        std::size_t mnSamples = 0;
+    };
+
     void FilterBlock(tessel::Raster* poIn, tessel::Mask* poMaskIn, tessel::Raster* poOut) const;
 
     std::optional<filters::Window> moWindow;
@@ -151,6 +164,8 @@ private:
     bool mbMasksMissingData = true;
     std::shared_ptr<const tessel::IMaskBuilder> mpoMissingData;
     std::optional<tessel::KORInterpretationTypes> meComplex;
+    std::shared_ptr<Scratch> mpoScratchIn = std::make_shared<Scratch>();
+    std::shared_ptr<Scratch> mpoScratchOut = std::make_shared<Scratch>();
 };
 
 /// Reads blocks with the margins that a filter needs, and keeps everything that is in memory for

@@ -416,6 +416,28 @@ TEST_F(FilterIODriverTest, ErrorsOfWritingEndTheRun)
     EXPECT_EQ(RowsWritten(), 9);
 }
 
+// Blocks lend their memory to those after them; those cut off at the right side have another shape.
+TEST_F(FilterIODriverTest, MemoryOfBlocksIsUsedAgain)
+{
+    MemoryDataset oIn(5, 8, {eDT_8U});
+    MemoryDataset oOut(5, 8, {eDT_8U});
+    oIn.mnTileWidth = oIn.mnTileHeight = oOut.mnTileWidth = oOut.mnTileHeight = 2;
+    Reader oReader(&oIn, {1});
+    Writer oWriter(&oOut, {1});
+    moDriver.SetMemoryBudget(16);
+    std::set<const unsigned char*> opBuffers;
+    moDriver.moOnBlock = [&](const Raster* poIn, auto*, const Raster* poOut)
+    {
+        EXPECT_TRUE(poIn->mbOwnsBuffer);
+        opBuffers.insert(poIn->mpBuffer);
+        opBuffers.insert(poOut->mpBuffer);
+    };
+    moDriver.Run(&oReader, &oWriter);
+    EXPECT_EQ(moDriver.mnBlocks, 12);
+    EXPECT_LE(opBuffers.size(), 12U);
+    EXPECT_EQ(oOut.Sample<unsigned char>(1, 4, 7), oIn.Sample<unsigned char>(1, 4, 7));
+}
+
 // Such an error says its words by what(); its message is empty.
 TEST_F(FilterIODriverTest, ErrorsKeepTheirWordsOnTheWay)
 {
