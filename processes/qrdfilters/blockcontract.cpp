@@ -43,18 +43,14 @@ bool SameMargins(const tessel::RasterContext& a, const tessel::RasterContext& b)
 
 }  // namespace
 
-void RequireMatchingBlocks(const tessel::Raster& oRasterIn, const tessel::Mask* poMaskIn,
-                           const tessel::Raster& oRasterOut, const tessel::Mask* poMaskOut,
-                           const char* pszSource, const std::source_location& oWhere)
+void RequireMatchingSizes(const tessel::Raster& oRasterIn, const tessel::Mask* poMaskIn,
+                          const tessel::Raster& oRasterOut, const tessel::Mask* poMaskOut,
+                          const char* pszSource, const std::source_location& oWhere)
 {
     if constexpr (kHardened)
     {
         Require(SameSize(oRasterIn, oRasterOut),
                 "poRasterOut has " + Size(oRasterOut) + ", poRasterIn " + Size(oRasterIn),
-                pszSource, oWhere);
-        Require(oRasterIn.mnChannels == oRasterOut.mnChannels,
-                "poRasterOut has " + std::to_string(oRasterOut.mnChannels) +
-                    " channels, poRasterIn " + std::to_string(oRasterIn.mnChannels),
                 pszSource, oWhere);
         Require(poMaskIn == nullptr ||
                     (SameSize(oRasterIn, *poMaskIn) && SameMargins(oRasterIn, *poMaskIn)),
@@ -64,6 +60,20 @@ void RequireMatchingBlocks(const tessel::Raster& oRasterIn, const tessel::Mask* 
         Require(poMaskOut == nullptr || SameSize(oRasterIn, *poMaskOut),
                 "poMaskOut has " + (poMaskOut != nullptr ? Size(*poMaskOut) : "") +
                     ", poRasterIn " + Size(oRasterIn),
+                pszSource, oWhere);
+    }
+}
+
+void RequireMatchingBlocks(const tessel::Raster& oRasterIn, const tessel::Mask* poMaskIn,
+                           const tessel::Raster& oRasterOut, const tessel::Mask* poMaskOut,
+                           const char* pszSource, const std::source_location& oWhere)
+{
+    if constexpr (kHardened)
+    {
+        RequireMatchingSizes(oRasterIn, poMaskIn, oRasterOut, poMaskOut, pszSource, oWhere);
+        Require(oRasterIn.mnChannels == oRasterOut.mnChannels,
+                "poRasterOut has " + std::to_string(oRasterOut.mnChannels) +
+                    " channels, poRasterIn " + std::to_string(oRasterIn.mnChannels),
                 pszSource, oWhere);
     }
 }

@@ -12,8 +12,14 @@
 namespace kor::filters
 {
 
-/// The output has the width, height and channels of the input, the input mask the geometry of the
-/// input raster, and the output mask its width and height. The masks may be null.
+/// The output has the width and height of the input, the input mask the geometry of the input
+/// raster, and the output mask its width and height. The masks may be null.
+void RequireMatchingSizes(const tessel::Raster& oRasterIn, const tessel::Mask* poMaskIn,
+                          const tessel::Raster& oRasterOut, const tessel::Mask* poMaskOut,
+                          const char* pszSource,
+                          const std::source_location& oWhere = std::source_location::current());
+
+/// The same, and the output has the channels of the input.
 void RequireMatchingBlocks(const tessel::Raster& oRasterIn, const tessel::Mask* poMaskIn,
                            const tessel::Raster& oRasterOut, const tessel::Mask* poMaskOut,
                            const char* pszSource,

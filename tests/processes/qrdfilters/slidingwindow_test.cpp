@@ -6,6 +6,7 @@
 #include <vector>
 
 #include "tests/support/blocks.h"
+#include "tests/support/plainwindow.h"
 
 namespace kor::filters
 {
@@ -20,163 +21,11 @@ using test::Margins;
 using test::Random;
 using test::Samples;
 
-/// Four sums of a window or of a column, as the filters define them.
-struct Accumulator
-{
-    double mdfSquares = 0.0;
-    double mdfSum = 0.0;
-    double mdfCount = 0.0;
-    double mdfCentre = 0.0;
-
-    void Add(double dfSample)
-    {
-        mdfSquares += dfSample * dfSample;
-        mdfSum += dfSample;
-        mdfCount += 1.0;
-    }
-    void Subtract(double dfSample)
-    {
-        mdfSquares -= dfSample * dfSample;
-        mdfSum -= dfSample;
-        mdfCount -= 1.0;
-    }
-    Accumulator& operator+=(const Accumulator& oOther)
-    {
-        mdfSquares += oOther.mdfSquares;
-        mdfSum += oOther.mdfSum;
-        mdfCount += oOther.mdfCount;
-        return *this;
-    }
-    Accumulator& operator-=(const Accumulator& oOther)
-    {
-        mdfSquares -= oOther.mdfSquares;
-        mdfSum -= oOther.mdfSum;
-        mdfCount -= oOther.mdfCount;
-        return *this;
-    }
-};
-
 /// A finishing function that shows every field: different weights tell them apart.
 double Finish(double dfSquares, double dfSum, double dfCount, double dfCentre)
 {
     return dfSquares * 0.5 + dfSum / dfCount - dfCentre * 0.25;
 }
-
-/// The definition: plain loops over pixels, one after the other.
-template <class TSample>
-class PlainEngine
-{
-public:
-    PlainEngine(const Raster& oIn, const Mask* poMaskIn, const Window& oWindow, bool bBGZero,
-                Raster& oOut, const Mask* poMaskOut)
-        : moIn(oIn),
-          mpoMaskIn(poMaskIn),
-          mnHalfX(oWindow.mnHalfX),
-          mnHalfY(oWindow.mnHalfY),
-          mbBGZero(bBGZero),
-          moOut(oOut),
-          mpoMaskOut(poMaskOut),
-          mvoColumns(oIn.mnChannels * (oIn.mnWidth + 2 * oWindow.mnHalfX))
-    {
-    }
-
-    void Run()
-    {
-        for (int x = -mnHalfX; x < Width() + mnHalfX; ++x)
-        {
-            for (int y = -mnHalfY; y <= mnHalfY; ++y)
-            {
-                ForValid(x, y,
-                         [](Accumulator& oColumn, double dfSample) { oColumn.Add(dfSample); });
-            }
-        }
-        for (int x = 0; x < Width(); ++x)
-        {
-            for (std::uint32_t c = 0; c < moIn.mnChannels; ++c)
-            {
-                Write(x, 0, c, FreshSum(x, c));
-            }
-        }
-        for (int y = 1; y < static_cast<int>(moIn.mnHeight); ++y)
-        {
-            RunRow(y);
-        }
-    }
-
-private:
-    int Width() const { return static_cast<int>(moIn.mnWidth); }
-
-    Accumulator& Column(int x, std::uint32_t c)
-    {
-        return mvoColumns[static_cast<std::size_t>(x + mnHalfX) * moIn.mnChannels + c];
-    }
-
-    template <class Body>
-    void ForValid(int x, int y, const Body& oBody)
-    {
-        if (test::IsValid(mpoMaskIn, x, y))
-        {
-            for (std::uint32_t c = 0; c < moIn.mnChannels; ++c)
-            {
-                oBody(Column(x, c), static_cast<double>(moIn.GetPixelAs<TSample>(x, y)[c]));
-            }
-        }
-    }
-
-    Accumulator FreshSum(int x, std::uint32_t c)
-    {
-        Accumulator oSum;
-        for (int dx = -mnHalfX; dx <= mnHalfX; ++dx)
-        {
-            oSum += Column(x + dx, c);
-        }
-        return oSum;
-    }
-
-    void RunRow(int y)
-    {
-        for (int x = -mnHalfX; x < Width() + mnHalfX; ++x)
-        {
-            ForValid(x, y - mnHalfY - 1,
-                     [](Accumulator& oColumn, double dfSample) { oColumn.Subtract(dfSample); });
-            ForValid(x, y + mnHalfY,
-                     [](Accumulator& oColumn, double dfSample) { oColumn.Add(dfSample); });
-        }
-        for (std::uint32_t c = 0; c < moIn.mnChannels; ++c)
-        {
-            Accumulator oRunning = FreshSum(0, c);
-            Write(0, y, c, oRunning);
-            for (int x = 1; x < Width(); ++x)
-            {
-                oRunning -= Column(x - mnHalfX - 1, c);
-                oRunning += Column(x + mnHalfX, c);
-                Write(x, y, c, oRunning);
-            }
-        }
-    }
-
-    void Write(int x, int y, std::uint32_t c, const Accumulator& oSum)
-    {
-        TSample& oResult = moOut.GetPixelAs<TSample>(x, y)[c];
-        const TSample oCentre = moIn.GetPixelAs<TSample>(x, y)[c];
-        if (!test::IsValid(mpoMaskIn, x, y) || !test::IsValid(mpoMaskOut, x, y))
-        {
-            oResult = mbBGZero ? TSample(0) : oCentre;
-            return;
-        }
-        oResult = static_cast<TSample>(
-            Finish(oSum.mdfSquares, oSum.mdfSum, oSum.mdfCount, static_cast<double>(oCentre)));
-    }
-
-    const Raster& moIn;
-    const Mask* mpoMaskIn;
-    int mnHalfX;
-    int mnHalfY;
-    bool mbBGZero;
-    Raster& moOut;
-    const Mask* mpoMaskOut;
-    std::vector<Accumulator> mvoColumns;
-};
 
 template <class TSample>
 void RunEngine(const Raster& oIn, const Mask* poMaskIn, const Window& oWindow, bool bBGZero,
@@ -238,8 +87,11 @@ void CompareWithPlainEngine(const Shape& oShape, const tessel::DataType& oType, 
         const auto poExpected = test::BlankRaster(oShape.mnWidth, oShape.mnHeight,
                                                   oShape.mnChannels, oType, oOutMargins);
         RunEngine<TSample>(*poIn, poIgnored, oShape.moWindow, bBGZero, *poActual, poClipped);
-        PlainEngine<TSample>(*poIn, poIgnored, oShape.moWindow, bBGZero, *poExpected, poClipped)
-            .Run();
+        test::FilterPlainly<TSample, test::MomentTerms>(
+            *poIn, poIgnored, oShape.moWindow, bBGZero,
+            [](const auto& oSums, double dfCentre)
+            { return Finish(oSums.moValues[0], oSums.moValues[1], oSums.mdfCount, dfCentre); },
+            *poExpected, poClipped);
         ASSERT_TRUE(test::SameBits(*poActual, *poExpected)) << oShape << ", case " << nCase;
     }
 }
