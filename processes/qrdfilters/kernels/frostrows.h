@@ -1,0 +1,68 @@
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <span>
+
+/// Row kernels of the Frost filters: coefficients from window sums, and means over windows weighted
+/// by distance. All lengths are multiples of kRowPadding.
+namespace kor::filters::kernels
+{
+
+/// Window sums of a stretch of samples, and the samples in the middle of the windows.
+struct WindowMoments
+{
+    const double* pSums;
+    const double* pSumsOfSquares;
+    const double* pCounts;
+    const double* pCentres;
+};
+
+/// What becomes of each sample of a stretch: the weighted mean of its window with this coefficient
+/// where pWeighted is not 0, else the value of pFixed.
+struct WeightingRow
+{
+    double* pCoefficients;
+    double* pFixed;
+    double* pWeighted;  ///< 1 or 0
+};
+
+/// Coefficient variance / (mean * mean) * dfDamp; the centre where the count is 1.
+void FindFrostCoefficients(const WindowMoments& oMoments, double dfDamp, std::size_t nSamples,
+                           const WeightingRow& oRow);
+
+struct EnhancedFrostLimits
+{
+    double dfCu;
+    double dfCmax;
+    double dfDamp;
+};
+
+/// With Ci = sqrt(variance) / mean: the mean where dfCu > Ci, else the centre where Ci > dfCmax or
+/// the count is 1, else the coefficient (Ci - dfCu) * dfDamp / (dfCmax - Ci).
+void FindEnhancedFrostCoefficients(const WindowMoments& oMoments,
+                                   const EnhancedFrostLimits& oLimits, std::size_t nSamples,
+                                   const WeightingRow& oRow);
+
+/// Samples that are weighted together: the weights of a 7 x 7 window stay in the first-level cache.
+inline constexpr std::size_t kWeightedSamples = 64;
+
+/// Windows around a few samples side by side in a row, and their weights.
+struct WeightedWindows
+{
+    std::span<const double* const> oRows;  ///< each from the left end of the first sample's window
+    /// All bits set for samples that count, no bit for the others, which are +0.0; empty where all
+    /// count.
+    std::span<const std::uint64_t* const> oValid;
+    std::size_t nColumns;  ///< of a window
+    std::size_t nStep;     ///< samples from one column to the next
+    /// Where the weights of a pixel of the window lie in pWeights, pixels in row order.
+    std::span<const std::uint32_t> oWeightOf;
+    const double* pWeights;  ///< of the first sample; those of the next ones follow
+};
+
+/// oMeans[i] = (0 + w * x + ...) / (0 + w + ...) over the pixels of window i in row order. At most
+/// kWeightedSamples.
+void FindWeightedMeans(const WeightedWindows& oWindows, std::span<double> oMeans);
+
+}  // namespace kor::filters::kernels
