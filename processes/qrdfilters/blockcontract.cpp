@@ -111,4 +111,13 @@ void RequireWindowInside(const Window& oWindow, const tessel::Raster& oRasterIn,
     }
 }
 
+void RequireDoubleBlocks(const tessel::Raster& oRasterIn, const tessel::Mask* poMaskIn,
+                         const tessel::Raster& oRasterOut, const tessel::Mask* poMaskOut,
+                         const char* pszSource, const std::source_location& oWhere)
+{
+    RequireType(oRasterIn, tessel::eDT_64R, "poRasterIn", pszSource, oWhere);
+    RequireType(oRasterOut, tessel::eDT_64R, "poRasterOut", pszSource, oWhere);
+    RequireMatchingBlocks(oRasterIn, poMaskIn, oRasterOut, poMaskOut, pszSource, oWhere);
+}
+
 }  // namespace kor::filters

@@ -36,4 +36,10 @@ void RequireWindowInside(const Window& oWindow, const tessel::Raster& oRasterIn,
                          const tessel::Mask* poMaskIn, const char* pszSource,
                          const std::source_location& oWhere = std::source_location::current());
 
+/// What a filter of doubles is promised: two blocks of eDT_64R that match as above.
+void RequireDoubleBlocks(const tessel::Raster& oRasterIn, const tessel::Mask* poMaskIn,
+                         const tessel::Raster& oRasterOut, const tessel::Mask* poMaskOut,
+                         const char* pszSource,
+                         const std::source_location& oWhere = std::source_location::current());
+
 }  // namespace kor::filters

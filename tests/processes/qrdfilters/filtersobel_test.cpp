@@ -1,0 +1,178 @@
+#include "processes/qrdfilters/filtersobel.h"
+
+#include <gtest/gtest.h>
+
+#include "platform/exception/exception.h"
+#include "tests/support/blocks.h"
+
+namespace kor::filters
+{
+namespace
+{
+
+using namespace kor::test;
+
+Image<double> Filtered(const FilterSobel& oFilter, const Image<double>& oImage, Margins oMargins,
+                       tessel::Mask* poMaskIn = nullptr, tessel::Mask* poMaskOut = nullptr,
+                       std::uint32_t nChannels = 1)
+{
+    const auto poIn = RasterOf(oImage, oMargins, nChannels);
+    const auto poOut = BlankRaster(poIn->mnWidth, poIn->mnHeight, nChannels, tessel::eDT_64R);
+    oFilter.Process(poIn.get(), poMaskIn, poOut.get(), poMaskOut);
+    return ImageOf<double>(*poOut);
+}
+
+const Image<double> kColumnStep = {
+    {0, 0, 0, 10, 10, 10},
+    {0, 0, 0, 10, 10, 10},
+    {0, 0, 0, 10, 10, 10},
+};
+
+TEST(FilterSobel, IsZeroOnAFlatImage)
+{
+    const Image<double> oImage = {{7, 7, 7, 7}, {7, 7, 7, 7}, {7, 7, 7, 7}};
+    EXPECT_EQ(Filtered(FilterSobel(), oImage, {1, 1}), (Image<double>{{0, 0}}));
+}
+
+TEST(FilterSobel, IsFourTimesAStepOnBothSidesOfIt)
+{
+    EXPECT_EQ(Filtered(FilterSobel(), kColumnStep, {1, 1}), (Image<double>{{0, 40, 40, 0}}));
+    const Image<double> oRowStep = {
+        {0, 0, 0}, {0, 0, 0}, {0, 0, 0}, {10, 10, 10}, {10, 10, 10}, {10, 10, 10},
+    };
+    EXPECT_EQ(Filtered(FilterSobel(), oRowStep, {1, 1}), (Image<double>{{0}, {40}, {40}, {0}}));
+}
+
+// Gx = 3 - 1 - 2 * 4 + 2 * 6 - 7 + 8 = 7, Gy = 2 * 2 + 1 + 3 - 7 - 2 * 9 - 8 = -25.
+TEST(FilterSobel, WeighsTheStraightNeighboursTwice)
+{
+    const Image<double> oImage = {{1, 2, 3}, {4, 99, 6}, {7, 9, 8}};
+    EXPECT_EQ(Filtered(FilterSobel(), oImage, {1, 1}), (Image<double>{{std::sqrt(674.0)}}));
+}
+
+TEST(FilterSobel, MultipliesByTheFactorAndDoesNotClip)
+{
+    EXPECT_EQ(Filtered(FilterSobel(-100.0), kColumnStep, {1, 1}),
+              (Image<double>{{-0.0, -4000, -4000, -0.0}}));
+    FilterSobel oFilter;
+    oFilter.SetFactor(0.5);
+    EXPECT_EQ(Filtered(oFilter, kColumnStep, {1, 1}), (Image<double>{{0, 20, 20, 0}}));
+}
+
+TEST(FilterSobel, TreatsChannelsByThemselves)
+{
+    const Image<double> oImage = {
+        {0, 5, 0, 5, 10, 5},
+        {0, 5, 0, 5, 10, 5},
+        {0, 5, 0, 5, 10, 5},
+    };
+    EXPECT_EQ(Filtered(FilterSobel(), oImage, {1, 1}, nullptr, nullptr, 2),
+              (Image<double>{{40, 0}}));
+}
+
+TEST(FilterSobel, ReadsOnePixelOfDeeperMargins)
+{
+    std::vector<double> vdfSamples(11 * 11, 1e6);
+    for (std::size_t i = 0; i < 9; ++i)
+    {
+        vdfSamples[(4 + i / 3) * 11 + 4 + i % 3] = i % 3 == 2 ? 10 : 0;
+    }
+    EXPECT_EQ(Filtered(FilterSobel(), Image<double>(11, vdfSamples), {5, 5}),
+              (Image<double>{{40}}));
+}
+
+// Columns 0 0 0 | 10 10 10. Without the masked pixel both sides of the step give 40; beside it the
+// upper right 10 counts as the centre's 0, and 10 * 1 of the gradient is gone there: Gx = 30,
+// Gy = 0 + 0 + 0 - 0 - 0 - 10 = -10.
+TEST(FilterSobel, LetsAMaskedNeighbourCountAsTheCentre)
+{
+    const auto poMask = MaskOf(
+        {
+            {1, 1, 1, 0, 1, 1},
+            {1, 1, 1, 1, 1, 1},
+            {1, 1, 1, 1, 1, 1},
+        },
+        {1, 1});
+    // The pixel to the right of the step: its upper neighbour counts as 10, which it is.
+    EXPECT_EQ(Filtered(FilterSobel(), kColumnStep, {1, 1}, poMask.get()),
+              (Image<double>{{0, std::sqrt(1000.0), 40, 0}}));
+}
+
+TEST(FilterSobel, WritesZeroWhereNothingIsComputed)
+{
+    const auto poMaskIn = MaskOf(
+        {
+            {1, 1, 1, 1, 1, 1},
+            {1, 0, 1, 1, 1, 1},
+            {1, 1, 1, 1, 1, 1},
+        },
+        {1, 1});
+    const auto poMaskOut = MaskOf({{1, 1, 1, 0}});
+    const Image<double> oImage = {
+        {0, 0, 0, 10, 10, 10},
+        {0, 3, 0, 10, 10, 10},
+        {0, 0, 0, 10, 10, 10},
+    };
+    EXPECT_EQ(Filtered(FilterSobel(), oImage, {1, 1}, poMaskIn.get(), poMaskOut.get()),
+              (Image<double>{{0, 40, 40, 0}}));
+    EXPECT_EQ(Filtered(FilterSobel(1.0, false), oImage, {1, 1}, poMaskIn.get(), poMaskOut.get()),
+              (Image<double>{{3, 40, 40, 10}}));
+}
+
+TEST(FilterSobel, TakesBothParametersInTheOrderOfSetParameters)
+{
+    const auto poMaskOut = MaskOf({{1, 1, 1, 0}});
+    const Image<double> oExpected = {{0, 80, 80, 10}};
+    FilterSobel oFilter;
+    oFilter.SetParameters(false, 2.0);
+    EXPECT_EQ(Filtered(oFilter, kColumnStep, {1, 1}, nullptr, poMaskOut.get()), oExpected);
+    EXPECT_EQ(Filtered(FilterSobel(2.0, false), kColumnStep, {1, 1}, nullptr, poMaskOut.get()),
+              oExpected);
+    const FilterSobel oCopy(oFilter);
+    EXPECT_EQ(Filtered(oCopy, kColumnStep, {1, 1}, nullptr, poMaskOut.get()), oExpected);
+    FilterSobel oAssigned;
+    oAssigned = oFilter;
+    EXPECT_EQ(Filtered(oAssigned, kColumnStep, {1, 1}, nullptr, poMaskOut.get()), oExpected);
+    oAssigned.SetBGZero(true);
+    EXPECT_EQ(Filtered(oAssigned, kColumnStep, {1, 1}, nullptr, poMaskOut.get()),
+              (Image<double>{{0, 80, 80, 0}}));
+}
+
+TEST(FilterSobel, RefusesMarginsOfZeroOnEitherSide)
+{
+    for (const Margins oMargins : {Margins{0, 1}, {1, 0}, {0, 0}})
+    {
+        const auto poIn = BlankRaster(3, 3, 1, tessel::eDT_64R, oMargins);
+        const auto poOut = BlankRaster(3, 3, 1, tessel::eDT_64R);
+        const auto poBefore = BlankRaster(3, 3, 1, tessel::eDT_64R);
+        try
+        {
+            FilterSobel().Process(poIn.get(), nullptr, poOut.get(), nullptr);
+            FAIL() << "nothing was thrown";
+        }
+        catch (const ParameterException& oException)
+        {
+            EXPECT_EQ(oException.GetMessage(), "The Margin of the input raster is too small");
+            EXPECT_EQ(oException.GetParameterName(), "oRasterIn");
+            EXPECT_EQ(oException.GetType(), ParameterException::Type::eInvalidValue);
+            EXPECT_EQ(oException.GetFirstText(), "");
+            EXPECT_EQ(oException.GetSecondText(), "");
+            EXPECT_EQ(oException.GetFile(), "processes/qrdfilters/filtersobel");
+            EXPECT_NE(oException.GetFunction().find("FilterSobel::ProcessBlock("),
+                      std::string::npos);
+            EXPECT_GT(oException.GetLine(), 0U);
+        }
+        EXPECT_TRUE(SameBits(*poOut, *poBefore));
+    }
+}
+
+TEST(FilterSobel, AcceptsBlocksWithoutPixels)
+{
+    const auto poNoRows = BlankRaster(4, 0, 1, tessel::eDT_64R, {1, 1});
+    const auto poNoColumns = BlankRaster(0, 4, 1, tessel::eDT_64R, {1, 1});
+    EXPECT_NO_THROW(FilterSobel().Process(poNoRows.get(), nullptr, poNoRows.get(), nullptr));
+    EXPECT_NO_THROW(FilterSobel().Process(poNoColumns.get(), nullptr, poNoColumns.get(), nullptr));
+}
+
+}  // namespace
+}  // namespace kor::filters
