@@ -57,6 +57,11 @@ void RequireSaneTiles(GDALDatasetH hDataset, const std::string& oFile)
     }
 }
 
+std::string SizeText(unsigned int nWidth, unsigned int nHeight)
+{
+    return std::to_string(nWidth) + " x " + std::to_string(nHeight);
+}
+
 /// Some drivers read zeros behind the end of a file of plain samples without an error.
 void RequireWholeFile(GDALDatasetH hDataset, const GdalLayout& oLayout, const std::string& oFile)
 {
@@ -188,9 +193,8 @@ void GdalDataset::RefuseMoreChannels(const tessel::RasterInfo& oInfo) const
     std::string oReason;
     if (oInfo.mnWidth != GetWidth() || oInfo.mnHeight != GetHeight())
     {
-        oReason = "channels of " + std::to_string(oInfo.mnWidth) + " x " +
-                  std::to_string(oInfo.mnHeight) + " pixels do not fit the image of " +
-                  std::to_string(GetWidth()) + " x " + std::to_string(GetHeight());
+        oReason = "channels of " + SizeText(oInfo.mnWidth, oInfo.mnHeight) +
+                  " pixels do not fit the image of " + SizeText(GetWidth(), GetHeight());
     }
     else if (oInfo.moDataType != mvoTypes.front())
     {
@@ -254,6 +258,103 @@ void GdalDataset::SetGeocodingInfo(const ogc::cs::GeocodingInfo& oInfo)
                     moGeocoding = ReadGeocoding(hDataset);
                     return bDone;
                 });
+}
+
+std::vector<GdalBitmap> GdalDataset::GetBitmaps() const
+{
+    std::vector<GdalBitmap> voBitmaps;
+    if (mpoFile)
+    {
+        mpoFile->Do("cannot look at the bitmaps",
+                    [&](GDALDatasetH hDataset)
+                    {
+                        voBitmaps = BitmapsOf(hDataset, moFile);
+                        return true;
+                    });
+    }
+    return voBitmaps;
+}
+
+GdalBitmap GdalDataset::GetBitmap(unsigned int nBitmap) const
+{
+    const std::vector<GdalBitmap> voBitmaps = GetBitmaps();
+    if (nBitmap == 0 || nBitmap > voBitmaps.size())
+    {
+        throw IOException(moFile + ": there is no bitmap " + std::to_string(nBitmap) +
+                              "; the file has " + std::to_string(voBitmaps.size()) +
+                              ", numbered from 1",
+                          kSource, __PRETTY_FUNCTION__, __LINE__);
+    }
+    return voBitmaps[nBitmap - 1];
+}
+
+unsigned int GdalDataset::GetBitmapCount() const
+{
+    return static_cast<unsigned int>(GetBitmaps().size());
+}
+
+unsigned int GdalDataset::CreateBitmap(unsigned int nWidth, unsigned int nHeight)
+{
+    RequireUpdate("cannot add a bitmap");
+    if (nWidth != GetWidth() || nHeight != GetHeight())
+    {
+        throw DataException(moFile + ": a bitmap of " + SizeText(nWidth, nHeight) +
+                                " pixels does not fit the image of " +
+                                SizeText(GetWidth(), GetHeight()),
+                            kSource, __PRETTY_FUNCTION__, __LINE__);
+    }
+    mpoFile->Do("cannot add a bitmap",
+                [&](GDALDatasetH hDataset) { return AddMask(hDataset, moFile); });
+    return GetBitmapCount();
+}
+
+AuxiliaryData GdalDataset::GetBitmapAuxiliaryData(unsigned int nBitmap) const
+{
+    const GdalBitmap oBitmap = GetBitmap(nBitmap);
+    const AuxiliaryData oAll = GetAuxiliaryData();
+    AuxiliaryData oData;
+    oData.SetFileMetadata(oAll.GetFileMetadata());
+    if (oBitmap.mnBand != 0)
+    {
+        oData.SetChannel(oAll.GetChannels().at(static_cast<unsigned int>(oBitmap.mnBand)), 1);
+    }
+    return oData;
+}
+
+void GdalDataset::SetBitmapAuxiliaryData(const AuxiliaryData& oData, unsigned int nBitmap)
+{
+    RequireUpdate("cannot set the metadata");
+    const GdalBitmap oBitmap = GetBitmap(nBitmap);
+    AuxiliaryData oAll;
+    oAll.SetFileMetadata(oData.GetFileMetadata());
+    const auto itEntry = oData.GetChannels().find(1);
+    if (itEntry != oData.GetChannels().end())
+    {
+        if (oBitmap.mnBand != 0)
+        {
+            oAll.SetChannel(itEntry->second, static_cast<unsigned int>(oBitmap.mnBand));
+        }
+        else if (itEntry->second != AuxiliaryData::Channel())
+        {
+            throw DataException(moFile + ": the mask of a file of the format " +
+                                    mpoFile->GetFormat() +
+                                    " has no description, no-data value or metadata of its own",
+                                kSource, __PRETTY_FUNCTION__, __LINE__);
+        }
+    }
+    SetAuxiliaryData(oAll);
+}
+
+std::unique_ptr<IChannelIO> GdalDataset::OpenBitmap(unsigned int nBitmap, bool bWrite)
+{
+    const GdalBitmap oBitmap = GetBitmap(nBitmap);
+    if (bWrite)
+    {
+        RequireUpdate("cannot write a bitmap");
+    }
+    // The one handle serves all readers of bitmaps: mask builders make one for every block, and a
+    // handle opened for it would have to unpack the mask from the start.
+    return std::make_unique<GdalBitmapIO>(mpoFile, oBitmap);
 }
 
 void GdalDataset::Flush()

@@ -4,15 +4,17 @@
 #include <string>
 #include <vector>
 
+#include "platform/datasources/gdal/gdalbitmaps.h"
 #include "platform/datasources/gdal/gdalchannelio.h"
 #include "platform/datasources/gdal/gdalfile.h"
+#include "platform/datasources/ibitmapdataset.h"
 #include "platform/datasources/irasterdataset.h"
 
 namespace kor::datasources
 {
 
 /// A file behind GDAL.
-class GdalDataset : public IRasterDataset
+class GdalDataset : public IRasterDataset, public IBitmapDataset
 {
 public:
     /// Opens a file.
@@ -42,9 +44,20 @@ public:
     unsigned int GetTileHeight() const override { return mnTileHeight; }
     std::unique_ptr<IChannelIO> OpenChannels(bool bWrite) override;
 
+    unsigned int GetBitmapWidth() const override { return GetWidth(); }
+    unsigned int GetBitmapHeight() const override { return GetHeight(); }
+    unsigned int GetBitmapCount() const override;
+    unsigned int CreateBitmap(unsigned int nWidth, unsigned int nHeight) override;
+    AuxiliaryData GetBitmapAuxiliaryData(unsigned int nBitmap) const override;
+    void SetBitmapAuxiliaryData(const AuxiliaryData& oData, unsigned int nBitmap) override;
+    std::unique_ptr<IChannelIO> OpenBitmap(unsigned int nBitmap, bool bWrite) override;
+
 private:
     void TakeLayout();
     void RequireUpdate(const char* pszTask) const;
+    std::vector<GdalBitmap> GetBitmaps() const;
+    /// Throws kor::IOException when there is no such bitmap.
+    GdalBitmap GetBitmap(unsigned int nBitmap) const;
     [[noreturn]] void RefuseMoreChannels(const tessel::RasterInfo& oInfo) const;
 
     std::string moFile;

@@ -206,6 +206,11 @@ std::shared_ptr<GdalFile> GdalFile::Create(const std::string& oFile, const std::
     {
         oOptions.SetNameValue("PIXELTYPE", "SIGNEDBYTE");
     }
+    if (oFormat == "GTiff" && oOptions.FetchNameValue("ALPHA") == nullptr)
+    {
+        // GDAL would take the last of four 8-bit channels for opacities and hide pixels by it.
+        oOptions.SetNameValue("ALPHA", "NO");
+    }
     OwnedGdalDataset poDataset(
         GDALCreate(hDriver, GdalName(oFile).c_str(), static_cast<int>(oInfo.mnWidth),
                    static_cast<int>(oInfo.mnHeight), static_cast<int>(oInfo.mnChannels),
