@@ -6,11 +6,13 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <exception>
 #include <filesystem>
 #include <system_error>
 
 #include "platform/datasources/datatypename.h"
 #include "platform/datasources/gdal/gdalauxiliary.h"
+#include "platform/datasources/gdal/gdalkept.h"
 #include "platform/datasources/gdal/gdaltypes.h"
 #include "platform/exception/exception.h"
 
@@ -102,9 +104,9 @@ GdalDataset::GdalDataset(const std::string& oFile, bool bUpdate)
                 });
 }
 
-GdalDataset::GdalDataset(const std::string& oFile, const std::string& oFormat,
-                         const std::vector<std::string>& voOptions)
-    : moFile(oFile), moFormat(oFormat), mvoOptions(voOptions)
+GdalDataset::GdalDataset(const std::string& oFile, std::string oFormat,
+                         std::vector<std::string> voOptions)
+    : moFile(oFile), moFormat(std::move(oFormat)), mvoOptions(std::move(voOptions))
 {
     TakeName(oFile);
 }
@@ -125,7 +127,6 @@ void GdalDataset::TakeLayout()
         [&](GDALDatasetH hDataset)
         {
             moLayout = LayoutOf(hDataset);
-            moGeocoding = ReadGeocoding(hDataset);
             mvoTypes.clear();
             for (int nBand = 1; nBand <= GDALGetRasterCount(hDataset); ++nBand)
             {
@@ -138,12 +139,13 @@ void GdalDataset::TakeLayout()
             {
                 GDALGetBlockSize(GDALGetRasterBand(hDataset, 1), &nTileWidth, &nTileHeight);
             }
-            mnTileWidth = static_cast<unsigned int>(std::max(1, nTileWidth));
-            mnTileHeight = static_cast<unsigned int>(std::max(1, nTileHeight));
+            mnTileWidth = static_cast<unsigned int>(
+                std::clamp(nTileWidth, std::min(1, moLayout.mnWidth), moLayout.mnWidth));
+            mnTileHeight = static_cast<unsigned int>(
+                std::clamp(nTileHeight, std::min(1, moLayout.mnHeight), moLayout.mnHeight));
             return true;
         });
-    mnTileWidth = std::min(mnTileWidth, GetWidth());
-    mnTileHeight = std::min(mnTileHeight, GetHeight());
+    TakeGeocoding();
 }
 
 void GdalDataset::RequireUpdate(const char* pszTask) const
@@ -196,7 +198,7 @@ void GdalDataset::RefuseMoreChannels(const tessel::RasterInfo& oInfo) const
         oReason = "channels of " + SizeText(oInfo.mnWidth, oInfo.mnHeight) +
                   " pixels do not fit the image of " + SizeText(GetWidth(), GetHeight());
     }
-    else if (oInfo.moDataType != mvoTypes.front())
+    else if (!mvoTypes.empty() && oInfo.moDataType != mvoTypes.front())
     {
         oReason = "the format " + mpoFile->GetFormat() + " cannot hold channels of " +
                   DataTypeName(oInfo.moDataType) + " beside channels of " +
@@ -244,20 +246,82 @@ void GdalDataset::SetAuxiliaryData(const AuxiliaryData& oData)
     {
         GetChannelType(nChannel);  // throws when there is no such channel
     }
-    mpoFile->Do("cannot set the metadata",
-                [&](GDALDatasetH hDataset) { return WriteAuxiliaryData(hDataset, oData, moFile); });
+    RequireKeepableTexts(oData, moFile);
+    const auto oSet = [&](const AuxiliaryData& oValue)
+    {
+        mpoFile->Do("cannot set the metadata", [&](GDALDatasetH hDataset)
+                    { return WriteAuxiliaryData(hDataset, oValue, moFile); });
+    };
+    const AuxiliaryData oBefore = GetAuxiliaryData();
+    oSet(oData);
+    RequireKept([&] { return NotKept(oData, oBefore, GetAuxiliaryData()); },
+                [&] { oSet(oBefore); });
 }
 
 void GdalDataset::SetGeocodingInfo(const ogc::cs::GeocodingInfo& oInfo)
 {
     RequireUpdate("cannot set the georeferencing");
-    mpoFile->Do("cannot set the georeferencing",
+    const auto oSet = [&](const ogc::cs::GeocodingInfo& oValue)
+    {
+        mpoFile->Do("cannot set the georeferencing",
+                    [&](GDALDatasetH hDataset) { return WriteGeocoding(hDataset, oValue); });
+        TakeGeocoding();
+    };
+    const ogc::cs::GeocodingInfo oBefore = moGeocoding;
+    oSet(oInfo);
+    RequireKept(
+        [&]
+        {
+            TakeGeocoding();
+            return NotKept(oInfo, oBefore, moGeocoding, GetWidth(), GetHeight());
+        },
+        [&] { oSet(oBefore); });
+}
+
+void GdalDataset::TakeGeocoding()
+{
+    mpoFile->Do("cannot read the georeferencing",
                 [&](GDALDatasetH hDataset)
                 {
-                    const bool bDone = WriteGeocoding(hDataset, oInfo);
                     moGeocoding = ReadGeocoding(hDataset);
-                    return bDone;
+                    return true;
                 });
+}
+
+void GdalDataset::RequireKept(const std::function<std::string()>& oNotKept,
+                              const std::function<void()>& oPutBack)
+{
+    if (mpoFile->GetFormat() == "GTiff")
+    {
+        return;  // holds all that GDAL takes for it
+    }
+    std::exception_ptr poError;
+    try
+    {
+        mpoFile->Flush();  // what comes back shows once the file is opened anew
+        const std::string oLost = oNotKept();
+        if (oLost.empty())
+        {
+            return;
+        }
+        poError = std::make_exception_ptr(DataException(
+            moFile + ": the format " + mpoFile->GetFormat() + " does not keep " + oLost, kSource,
+            __PRETTY_FUNCTION__, __LINE__));
+    }
+    catch (const Exception&)
+    {
+        poError = std::current_exception();
+    }
+    try
+    {
+        oPutBack();
+        mpoFile->Flush();
+    }
+    catch (const Exception&)
+    {
+        // The first error says more than one on the way back.
+    }
+    std::rethrow_exception(poError);
 }
 
 std::vector<GdalBitmap> GdalDataset::GetBitmaps() const

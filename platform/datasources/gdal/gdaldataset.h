@@ -1,5 +1,6 @@
 #pragma once
 
+#include <functional>
 #include <memory>
 #include <string>
 #include <vector>
@@ -21,8 +22,7 @@ public:
     GdalDataset(const std::string& oFile, bool bUpdate);
     /// A file to be made of a format by its GDAL name: taken now, so that nobody else makes it,
     /// and made by CreateChannels.
-    GdalDataset(const std::string& oFile, const std::string& oFormat,
-                const std::vector<std::string>& voOptions);
+    GdalDataset(const std::string& oFile, std::string oFormat, std::vector<std::string> voOptions);
     ~GdalDataset() override;
 
     std::string GetFileName() const override { return moFile; }
@@ -54,7 +54,12 @@ public:
 
 private:
     void TakeLayout();
+    void TakeGeocoding();
     void RequireUpdate(const char* pszTask) const;
+    /// Throws kor::DataException, once oPutBack has run, when oNotKept names something that the
+    /// file does not hold as it was just told to.
+    void RequireKept(const std::function<std::string()>& oNotKept,
+                     const std::function<void()>& oPutBack);
     std::vector<GdalBitmap> GetBitmaps() const;
     /// Throws kor::IOException when there is no such bitmap.
     GdalBitmap GetBitmap(unsigned int nBitmap) const;

@@ -322,7 +322,7 @@ TEST_F(GdalBitmapsTest, MaskFileOfAFormatThatIsNotAllowedIsNotOpened)
     MakeMaskFile(File("x.tif"));
     const std::string oMoved = File("mask.tif");
     std::filesystem::rename(File("x.tif.msk"), oMoved);
-    DatasetManager::AllowDriver("BMP");  // now GDAL knows VRT files as well
+    DatasetManager::AllowDriver("DTED");  // now GDAL knows VRT files as well
     moDirectory.Write("x.tif.msk",
                       "<VRTDataset rasterXSize=\"4\" rasterYSize=\"3\"><Metadata><MDI key=\""
                       "INTERNAL_MASK_FLAGS_1\">2</MDI></Metadata><VRTRasterBand dataType=\"Byte\" "
