@@ -29,8 +29,8 @@ IRasterDataset* RequireRasterDataset(IDataset* poDataset)
 
 }  // namespace
 
-ChannelSet::ChannelSet(IDataset* poDataset, const std::vector<unsigned int>& oChannels, bool bWrite)
-    : mpoDataset(RequireRasterDataset(poDataset)), mvnChannels(oChannels)
+ChannelSet::ChannelSet(IDataset* poDataset, std::vector<unsigned int> oChannels, bool bWrite)
+    : mpoDataset(RequireRasterDataset(poDataset)), mvnChannels(std::move(oChannels))
 {
     if (mvnChannels.empty())
     {

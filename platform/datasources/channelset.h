@@ -17,7 +17,7 @@ class ChannelSet
 public:
     /// Throws kor::DataException when poDataset is null or no raster dataset or when the list is
     /// empty, kor::IOException when a channel does not exist or the dataset cannot be written to.
-    ChannelSet(IDataset* poDataset, const std::vector<unsigned int>& oChannels, bool bWrite);
+    ChannelSet(IDataset* poDataset, std::vector<unsigned int> oChannels, bool bWrite);
 
     IRasterDataset& GetDataset() const { return *mpoDataset; }
     IChannelIO& GetIO() const { return *mpoIO; }

@@ -32,8 +32,7 @@ AuxiliaryData::Metadata ReadMetadata(GDALMajorObjectH hObject)
     return oMetadata;
 }
 
-bool WriteMetadata(GDALMajorObjectH hObject, const AuxiliaryData::Metadata& oMetadata,
-                   const std::string& oFile)
+bool WriteMetadata(GDALMajorObjectH hObject, const AuxiliaryData::Metadata& oMetadata)
 {
     if (ReadMetadata(hObject) == oMetadata)
     {
@@ -42,11 +41,6 @@ bool WriteMetadata(GDALMajorObjectH hObject, const AuxiliaryData::Metadata& oMet
     CPLStringList oItems;
     for (const auto& [oKey, oValue] : oMetadata)
     {
-        if (oKey.empty() || oKey.find('=') != std::string::npos)
-        {
-            throw DataException(oFile + ": \"" + oKey + "\" cannot be the name of a metadata item",
-                                kSource, __PRETTY_FUNCTION__, __LINE__);
-        }
         oItems.AddString((oKey + "=" + oValue).c_str());
     }
     return GDALSetMetadata(hObject, oItems.List(), nullptr) == CE_None;
@@ -106,11 +100,6 @@ bool SetNoData(GDALRasterBandH hBand, double dfValue)
     return GDALSetRasterNoDataValue(hBand, dfValue) == CE_None;
 }
 
-bool SameNoData(const std::optional<double>& dfOne, const std::optional<double>& dfOther)
-{
-    return dfOne == dfOther || (dfOne && dfOther && std::isnan(*dfOne) && std::isnan(*dfOther));
-}
-
 /// A GeoTIFF has one no-data value for all its bands.
 void RequireOneNoData(GDALDatasetH hDataset, const AuxiliaryData& oData, const std::string& oFile)
 {
@@ -136,14 +125,13 @@ void RequireOneNoData(GDALDatasetH hDataset, const AuxiliaryData& oData, const s
     }
 }
 
-bool WriteChannel(GDALRasterBandH hBand, const AuxiliaryData::Channel& oChannel,
-                  const std::string& oFile)
+bool WriteChannel(GDALRasterBandH hBand, const AuxiliaryData::Channel& oChannel)
 {
     if (GDALGetDescription(hBand) != oChannel.moDescription)
     {
         GDALSetDescription(hBand, oChannel.moDescription.c_str());
     }
-    bool bDone = WriteMetadata(hBand, oChannel.moMetadata, oFile);
+    bool bDone = WriteMetadata(hBand, oChannel.moMetadata);
     if (bDone && !SameNoData(ReadNoData(hBand), oChannel.mdfNoData))
     {
         bDone = oChannel.mdfNoData ? SetNoData(hBand, *oChannel.mdfNoData)
@@ -153,6 +141,11 @@ bool WriteChannel(GDALRasterBandH hBand, const AuxiliaryData::Channel& oChannel,
 }
 
 }  // namespace
+
+bool SameNoData(const std::optional<double>& dfOne, const std::optional<double>& dfOther)
+{
+    return dfOne == dfOther || (dfOne && dfOther && std::isnan(*dfOne) && std::isnan(*dfOther));
+}
 
 AuxiliaryData ReadAuxiliaryData(GDALDatasetH hDataset)
 {
@@ -173,10 +166,10 @@ bool WriteAuxiliaryData(GDALDatasetH hDataset, const AuxiliaryData& oData, const
     bool bDone = true;
     for (const auto& [nChannel, oChannel] : oData.GetChannels())
     {
-        bDone = bDone && WriteChannel(GDALGetRasterBand(hDataset, static_cast<int>(nChannel)),
-                                      oChannel, oFile);
+        bDone = bDone &&
+                WriteChannel(GDALGetRasterBand(hDataset, static_cast<int>(nChannel)), oChannel);
     }
-    return bDone && WriteMetadata(hDataset, oData.GetFileMetadata(), oFile);
+    return bDone && WriteMetadata(hDataset, oData.GetFileMetadata());
 }
 
 ogc::cs::GeocodingInfo ReadGeocoding(GDALDatasetH hDataset)

@@ -15,8 +15,8 @@ GdalLayout LayoutOf(GDALDatasetH hDataset)
     return oLayout;
 }
 
-GdalChannelIO::GdalChannelIO(std::shared_ptr<GdalFile> poFile, const GdalLayout& oLayout)
-    : mpoFile(std::move(poFile)), moLayout(oLayout)
+GdalChannelIO::GdalChannelIO(std::shared_ptr<GdalFile> poFile, GdalLayout oLayout)
+    : mpoFile(std::move(poFile)), moLayout(std::move(oLayout))
 {
     bool bSame = false;
     mpoFile->Do("cannot look at the channels",
@@ -58,6 +58,7 @@ void GdalChannelIO::Write(std::span<const unsigned int> oChannels, const PixelWi
                           const unsigned char* pSamples, const SampleStrides& oStrides)
 {
     // GDAL takes one kind of pointer for both directions and does not write through this one.
+    // NOLINTNEXTLINE(cppcoreguidelines-pro-type-const-cast)
     auto* pSource = const_cast<unsigned char*>(pSamples);
     mpoFile->Do("cannot write pixels", [&](GDALDatasetH hDataset)
                 { return Transfer(hDataset, GF_Write, oChannels, oWindow, pSource, oStrides); });

@@ -29,7 +29,7 @@ class GdalChannelIO : public IChannelIO
 {
 public:
     /// Throws kor::IOException when the file has another layout by now.
-    GdalChannelIO(std::shared_ptr<GdalFile> poFile, const GdalLayout& oLayout);
+    GdalChannelIO(std::shared_ptr<GdalFile> poFile, GdalLayout oLayout);
 
     void Read(std::span<const unsigned int> oChannels, const PixelWindow& oWindow,
               unsigned char* pSamples, const SampleStrides& oStrides) override;

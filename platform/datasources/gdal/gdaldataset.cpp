@@ -6,11 +6,13 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <exception>
 #include <filesystem>
 #include <system_error>
 
 #include "platform/datasources/datatypename.h"
 #include "platform/datasources/gdal/gdalauxiliary.h"
+#include "platform/datasources/gdal/gdalkept.h"
 #include "platform/datasources/gdal/gdaltypes.h"
 #include "platform/exception/exception.h"
 
@@ -57,6 +59,11 @@ void RequireSaneTiles(GDALDatasetH hDataset, const std::string& oFile)
     }
 }
 
+std::string SizeText(unsigned int nWidth, unsigned int nHeight)
+{
+    return std::to_string(nWidth) + " x " + std::to_string(nHeight);
+}
+
 /// Some drivers read zeros behind the end of a file of plain samples without an error.
 void RequireWholeFile(GDALDatasetH hDataset, const GdalLayout& oLayout, const std::string& oFile)
 {
@@ -97,9 +104,9 @@ GdalDataset::GdalDataset(const std::string& oFile, bool bUpdate)
                 });
 }
 
-GdalDataset::GdalDataset(const std::string& oFile, const std::string& oFormat,
-                         const std::vector<std::string>& voOptions)
-    : moFile(oFile), moFormat(oFormat), mvoOptions(voOptions)
+GdalDataset::GdalDataset(const std::string& oFile, std::string oFormat,
+                         std::vector<std::string> voOptions)
+    : moFile(oFile), moFormat(std::move(oFormat)), mvoOptions(std::move(voOptions))
 {
     TakeName(oFile);
 }
@@ -120,7 +127,6 @@ void GdalDataset::TakeLayout()
         [&](GDALDatasetH hDataset)
         {
             moLayout = LayoutOf(hDataset);
-            moGeocoding = ReadGeocoding(hDataset);
             mvoTypes.clear();
             for (int nBand = 1; nBand <= GDALGetRasterCount(hDataset); ++nBand)
             {
@@ -133,12 +139,13 @@ void GdalDataset::TakeLayout()
             {
                 GDALGetBlockSize(GDALGetRasterBand(hDataset, 1), &nTileWidth, &nTileHeight);
             }
-            mnTileWidth = static_cast<unsigned int>(std::max(1, nTileWidth));
-            mnTileHeight = static_cast<unsigned int>(std::max(1, nTileHeight));
+            mnTileWidth = static_cast<unsigned int>(
+                std::clamp(nTileWidth, std::min(1, moLayout.mnWidth), moLayout.mnWidth));
+            mnTileHeight = static_cast<unsigned int>(
+                std::clamp(nTileHeight, std::min(1, moLayout.mnHeight), moLayout.mnHeight));
             return true;
         });
-    mnTileWidth = std::min(mnTileWidth, GetWidth());
-    mnTileHeight = std::min(mnTileHeight, GetHeight());
+    TakeGeocoding();
 }
 
 void GdalDataset::RequireUpdate(const char* pszTask) const
@@ -188,11 +195,10 @@ void GdalDataset::RefuseMoreChannels(const tessel::RasterInfo& oInfo) const
     std::string oReason;
     if (oInfo.mnWidth != GetWidth() || oInfo.mnHeight != GetHeight())
     {
-        oReason = "channels of " + std::to_string(oInfo.mnWidth) + " x " +
-                  std::to_string(oInfo.mnHeight) + " pixels do not fit the image of " +
-                  std::to_string(GetWidth()) + " x " + std::to_string(GetHeight());
+        oReason = "channels of " + SizeText(oInfo.mnWidth, oInfo.mnHeight) +
+                  " pixels do not fit the image of " + SizeText(GetWidth(), GetHeight());
     }
-    else if (oInfo.moDataType != mvoTypes.front())
+    else if (!mvoTypes.empty() && oInfo.moDataType != mvoTypes.front())
     {
         oReason = "the format " + mpoFile->GetFormat() + " cannot hold channels of " +
                   DataTypeName(oInfo.moDataType) + " beside channels of " +
@@ -240,20 +246,179 @@ void GdalDataset::SetAuxiliaryData(const AuxiliaryData& oData)
     {
         GetChannelType(nChannel);  // throws when there is no such channel
     }
-    mpoFile->Do("cannot set the metadata",
-                [&](GDALDatasetH hDataset) { return WriteAuxiliaryData(hDataset, oData, moFile); });
+    RequireKeepableTexts(oData, moFile);
+    const auto oSet = [&](const AuxiliaryData& oValue)
+    {
+        mpoFile->Do("cannot set the metadata", [&](GDALDatasetH hDataset)
+                    { return WriteAuxiliaryData(hDataset, oValue, moFile); });
+    };
+    const AuxiliaryData oBefore = GetAuxiliaryData();
+    oSet(oData);
+    RequireKept([&] { return NotKept(oData, oBefore, GetAuxiliaryData()); },
+                [&] { oSet(oBefore); });
 }
 
 void GdalDataset::SetGeocodingInfo(const ogc::cs::GeocodingInfo& oInfo)
 {
     RequireUpdate("cannot set the georeferencing");
-    mpoFile->Do("cannot set the georeferencing",
+    const auto oSet = [&](const ogc::cs::GeocodingInfo& oValue)
+    {
+        mpoFile->Do("cannot set the georeferencing",
+                    [&](GDALDatasetH hDataset) { return WriteGeocoding(hDataset, oValue); });
+        TakeGeocoding();
+    };
+    const ogc::cs::GeocodingInfo oBefore = moGeocoding;
+    oSet(oInfo);
+    RequireKept(
+        [&]
+        {
+            TakeGeocoding();
+            return NotKept(oInfo, oBefore, moGeocoding, GetWidth(), GetHeight());
+        },
+        [&] { oSet(oBefore); });
+}
+
+void GdalDataset::TakeGeocoding()
+{
+    mpoFile->Do("cannot read the georeferencing",
                 [&](GDALDatasetH hDataset)
                 {
-                    const bool bDone = WriteGeocoding(hDataset, oInfo);
                     moGeocoding = ReadGeocoding(hDataset);
-                    return bDone;
+                    return true;
                 });
+}
+
+void GdalDataset::RequireKept(const std::function<std::string()>& oNotKept,
+                              const std::function<void()>& oPutBack)
+{
+    if (mpoFile->GetFormat() == "GTiff")
+    {
+        return;  // holds all that GDAL takes for it
+    }
+    std::exception_ptr poError;
+    try
+    {
+        mpoFile->Flush();  // what comes back shows once the file is opened anew
+        const std::string oLost = oNotKept();
+        if (oLost.empty())
+        {
+            return;
+        }
+        poError = std::make_exception_ptr(DataException(
+            moFile + ": the format " + mpoFile->GetFormat() + " does not keep " + oLost, kSource,
+            __PRETTY_FUNCTION__, __LINE__));
+    }
+    catch (const Exception&)
+    {
+        poError = std::current_exception();
+    }
+    try
+    {
+        oPutBack();
+        mpoFile->Flush();
+    }
+    catch (const Exception&)
+    {
+        // The first error says more than one on the way back.
+    }
+    std::rethrow_exception(poError);
+}
+
+std::vector<GdalBitmap> GdalDataset::GetBitmaps() const
+{
+    std::vector<GdalBitmap> voBitmaps;
+    if (mpoFile)
+    {
+        mpoFile->Do("cannot look at the bitmaps",
+                    [&](GDALDatasetH hDataset)
+                    {
+                        voBitmaps = BitmapsOf(hDataset, moFile);
+                        return true;
+                    });
+    }
+    return voBitmaps;
+}
+
+GdalBitmap GdalDataset::GetBitmap(unsigned int nBitmap) const
+{
+    const std::vector<GdalBitmap> voBitmaps = GetBitmaps();
+    if (nBitmap == 0 || nBitmap > voBitmaps.size())
+    {
+        throw IOException(moFile + ": there is no bitmap " + std::to_string(nBitmap) +
+                              "; the file has " + std::to_string(voBitmaps.size()) +
+                              ", numbered from 1",
+                          kSource, __PRETTY_FUNCTION__, __LINE__);
+    }
+    return voBitmaps[nBitmap - 1];
+}
+
+unsigned int GdalDataset::GetBitmapCount() const
+{
+    return static_cast<unsigned int>(GetBitmaps().size());
+}
+
+unsigned int GdalDataset::CreateBitmap(unsigned int nWidth, unsigned int nHeight)
+{
+    RequireUpdate("cannot add a bitmap");
+    if (nWidth != GetWidth() || nHeight != GetHeight())
+    {
+        throw DataException(moFile + ": a bitmap of " + SizeText(nWidth, nHeight) +
+                                " pixels does not fit the image of " +
+                                SizeText(GetWidth(), GetHeight()),
+                            kSource, __PRETTY_FUNCTION__, __LINE__);
+    }
+    mpoFile->Do("cannot add a bitmap",
+                [&](GDALDatasetH hDataset) { return AddMask(hDataset, moFile); });
+    return GetBitmapCount();
+}
+
+AuxiliaryData GdalDataset::GetBitmapAuxiliaryData(unsigned int nBitmap) const
+{
+    const GdalBitmap oBitmap = GetBitmap(nBitmap);
+    const AuxiliaryData oAll = GetAuxiliaryData();
+    AuxiliaryData oData;
+    oData.SetFileMetadata(oAll.GetFileMetadata());
+    if (oBitmap.mnBand != 0)
+    {
+        oData.SetChannel(oAll.GetChannels().at(static_cast<unsigned int>(oBitmap.mnBand)), 1);
+    }
+    return oData;
+}
+
+void GdalDataset::SetBitmapAuxiliaryData(const AuxiliaryData& oData, unsigned int nBitmap)
+{
+    RequireUpdate("cannot set the metadata");
+    const GdalBitmap oBitmap = GetBitmap(nBitmap);
+    AuxiliaryData oAll;
+    oAll.SetFileMetadata(oData.GetFileMetadata());
+    const auto itEntry = oData.GetChannels().find(1);
+    if (itEntry != oData.GetChannels().end())
+    {
+        if (oBitmap.mnBand != 0)
+        {
+            oAll.SetChannel(itEntry->second, static_cast<unsigned int>(oBitmap.mnBand));
+        }
+        else if (itEntry->second != AuxiliaryData::Channel())
+        {
+            throw DataException(moFile + ": the mask of a file of the format " +
+                                    mpoFile->GetFormat() +
+                                    " has no description, no-data value or metadata of its own",
+                                kSource, __PRETTY_FUNCTION__, __LINE__);
+        }
+    }
+    SetAuxiliaryData(oAll);
+}
+
+std::unique_ptr<IChannelIO> GdalDataset::OpenBitmap(unsigned int nBitmap, bool bWrite)
+{
+    const GdalBitmap oBitmap = GetBitmap(nBitmap);
+    if (bWrite)
+    {
+        RequireUpdate("cannot write a bitmap");
+    }
+    // The one handle serves all readers of bitmaps: mask builders make one for every block, and a
+    // handle opened for it would have to unpack the mask from the start.
+    return std::make_unique<GdalBitmapIO>(mpoFile, oBitmap);
 }
 
 void GdalDataset::Flush()

@@ -1,26 +1,28 @@
 #pragma once
 
+#include <functional>
 #include <memory>
 #include <string>
 #include <vector>
 
+#include "platform/datasources/gdal/gdalbitmaps.h"
 #include "platform/datasources/gdal/gdalchannelio.h"
 #include "platform/datasources/gdal/gdalfile.h"
+#include "platform/datasources/ibitmapdataset.h"
 #include "platform/datasources/irasterdataset.h"
 
 namespace kor::datasources
 {
 
 /// A file behind GDAL.
-class GdalDataset : public IRasterDataset
+class GdalDataset : public IRasterDataset, public IBitmapDataset
 {
 public:
     /// Opens a file.
     GdalDataset(const std::string& oFile, bool bUpdate);
     /// A file to be made of a format by its GDAL name: taken now, so that nobody else makes it,
     /// and made by CreateChannels.
-    GdalDataset(const std::string& oFile, const std::string& oFormat,
-                const std::vector<std::string>& voOptions);
+    GdalDataset(const std::string& oFile, std::string oFormat, std::vector<std::string> voOptions);
     ~GdalDataset() override;
 
     std::string GetFileName() const override { return moFile; }
@@ -42,9 +44,25 @@ public:
     unsigned int GetTileHeight() const override { return mnTileHeight; }
     std::unique_ptr<IChannelIO> OpenChannels(bool bWrite) override;
 
+    unsigned int GetBitmapWidth() const override { return GetWidth(); }
+    unsigned int GetBitmapHeight() const override { return GetHeight(); }
+    unsigned int GetBitmapCount() const override;
+    unsigned int CreateBitmap(unsigned int nWidth, unsigned int nHeight) override;
+    AuxiliaryData GetBitmapAuxiliaryData(unsigned int nBitmap) const override;
+    void SetBitmapAuxiliaryData(const AuxiliaryData& oData, unsigned int nBitmap) override;
+    std::unique_ptr<IChannelIO> OpenBitmap(unsigned int nBitmap, bool bWrite) override;
+
 private:
     void TakeLayout();
+    void TakeGeocoding();
     void RequireUpdate(const char* pszTask) const;
+    /// Throws kor::DataException, once oPutBack has run, when oNotKept names something that the
+    /// file does not hold as it was just told to.
+    void RequireKept(const std::function<std::string()>& oNotKept,
+                     const std::function<void()>& oPutBack);
+    std::vector<GdalBitmap> GetBitmaps() const;
+    /// Throws kor::IOException when there is no such bitmap.
+    GdalBitmap GetBitmap(unsigned int nBitmap) const;
     [[noreturn]] void RefuseMoreChannels(const tessel::RasterInfo& oInfo) const;
 
     std::string moFile;

@@ -55,6 +55,22 @@ public:
     bool AllowFormat(const std::string& oFormat) override { return AllowGdalFormat(oFormat); }
 };
 
+bool CanMake(GDALDriverH hDriver)
+{
+    return hDriver != nullptr && GDALGetMetadataItem(hDriver, GDAL_DCAP_CREATE, nullptr) != nullptr;
+}
+
+/// Each behind a blank.
+std::string FormatsThatCanBeMade()
+{
+    std::string oFormats;
+    for (const std::string& oFormat : AllowedFormats())
+    {
+        oFormats += CanMake(GDALGetDriverByName(oFormat.c_str())) ? " " + oFormat : "";
+    }
+    return oFormats;
+}
+
 std::vector<std::string> SplitOptions(const std::string& oFile, const std::string& oOptions)
 {
     std::vector<std::string> voOptions;
@@ -77,11 +93,12 @@ std::unique_ptr<IDataset> GdalDriver::Create(const std::string& oFile, const std
 {
     const GdalErrors oErrors;
     GDALDriverH hDriver = GDALGetDriverByName(oFormat.c_str());
-    if (hDriver == nullptr || GDALGetMetadataItem(hDriver, GDAL_DCAP_CREATE, nullptr) == nullptr)
+    if (!CanMake(hDriver))
     {
-        throw DataException(
-            oFile + ": files of the format " + oFormat + " can be read but not made block by block",
-            kSource, __PRETTY_FUNCTION__, __LINE__);
+        throw DataException(oFile + ": files of the format " + oFormat +
+                                " can be read but not made block by block; formats that can:" +
+                                FormatsThatCanBeMade(),
+                            kSource, __PRETTY_FUNCTION__, __LINE__);
     }
     const auto voOptions = SplitOptions(oFile, oOptions);
     if (!GDALValidateCreationOptions(hDriver, StringListOf(voOptions).List()))

@@ -5,28 +5,28 @@
 namespace kor::datasources
 {
 
-namespace
+GdalOption::GdalOption(const char* pszName, const char* pszValue) : mpszName(pszName)
 {
+    if (const char* pszFormer = CPLGetThreadLocalConfigOption(pszName, nullptr))
+    {
+        moFormer = pszFormer;
+    }
+    CPLSetThreadLocalConfigOption(pszName, pszValue);
+}
 
-constexpr const char* kJpegOption = "GDAL_ERROR_ON_LIBJPEG_WARNING";
-
-}  // namespace
+GdalOption::~GdalOption()
+{
+    CPLSetThreadLocalConfigOption(mpszName, moFormer ? moFormer->c_str() : nullptr);
+}
 
 GdalErrors::GdalErrors()
 {
-    if (const char* pszFormer = CPLGetThreadLocalConfigOption(kJpegOption, nullptr))
-    {
-        moFormerJpegOption = pszFormer;
-    }
-    CPLSetThreadLocalConfigOption(kJpegOption, "TRUE");
     CPLPushErrorHandlerEx(&GdalErrors::Collect, this);
 }
 
 GdalErrors::~GdalErrors()
 {
     CPLPopErrorHandler();
-    CPLSetThreadLocalConfigOption(kJpegOption,
-                                  moFormerJpegOption ? moFormerJpegOption->c_str() : nullptr);
 }
 
 void CPL_STDCALL GdalErrors::Collect(CPLErr eClass, CPLErrorNum /*nNumber*/, const char* pszText)

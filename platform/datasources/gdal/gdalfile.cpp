@@ -38,7 +38,8 @@ OwnedGdalDataset OpenHandle(const std::string& oFile, bool bUpdate,
         GDALOpenEx(GdalName(oFile).c_str(), nFlags, oFormats.List(), nullptr, nullptr));
 }
 
-/// Files that a format writes beside the one it is told to: an older one would be lost.
+/// Files beside the one that a format is told to make: an older one would be lost or taken for part
+/// of the new file.
 std::vector<std::string> CompanionsOf(const std::string& oFile, const std::string& oFormat,
                                       const std::vector<std::string>& voOptions)
 {
@@ -70,6 +71,11 @@ std::vector<std::string> CompanionsOf(const std::string& oFile, const std::strin
     {
         voCompanions.push_back(std::filesystem::path(oFile).replace_extension(oEnding).string());
         voCompanions.push_back(oFile + "." + oEnding);
+    }
+    // GDAL would take these for the new file's own.
+    for (const char* pszEnding : {".aux.xml", ".msk", ".ovr"})
+    {
+        voCompanions.push_back(oFile + pszEnding);
     }
     return voCompanions;
 }
@@ -172,9 +178,9 @@ void CloseGdalDataset::operator()(void* hDataset) const
     GDALClose(hDataset);
 }
 
-GdalFile::GdalFile(OwnedGdalDataset poDataset, const std::string& oFile, bool bUpdate)
+GdalFile::GdalFile(OwnedGdalDataset poDataset, std::string oFile, bool bUpdate)
     : mpoDataset(std::move(poDataset)),
-      moFile(oFile),
+      moFile(std::move(oFile)),
       moFormat(GDALGetDriverShortName(GDALGetDatasetDriver(mpoDataset.get()))),
       mbUpdate(bUpdate)
 {
@@ -205,6 +211,11 @@ std::shared_ptr<GdalFile> GdalFile::Create(const std::string& oFile, const std::
     if (NeedsSignedByteOption(oInfo.moDataType))
     {
         oOptions.SetNameValue("PIXELTYPE", "SIGNEDBYTE");
+    }
+    if (oFormat == "GTiff" && oOptions.FetchNameValue("ALPHA") == nullptr)
+    {
+        // GDAL would take the last of four 8-bit channels for opacities and hide pixels by it.
+        oOptions.SetNameValue("ALPHA", "NO");
     }
     OwnedGdalDataset poDataset(
         GDALCreate(hDriver, GdalName(oFile).c_str(), static_cast<int>(oInfo.mnWidth),

@@ -50,7 +50,7 @@ public:
     bool IsUpdate() const { return mbUpdate; }
 
 private:
-    GdalFile(OwnedGdalDataset poDataset, const std::string& oFile, bool bUpdate);
+    GdalFile(OwnedGdalDataset poDataset, std::string oFile, bool bUpdate);
     [[noreturn]] void Throw(const std::string& oTask, const GdalErrors& oErrors) const;
 
     std::mutex moMutex;

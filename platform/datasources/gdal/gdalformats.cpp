@@ -9,12 +9,9 @@
 #include "platform/exception/exception.h"
 
 // A GDAL can be built without these; a weak name is null then.
-extern "C"
-{
-    void GDALRegister_JP2OpenJPEG() __attribute__((weak));
-    void GDALRegister_PNG() __attribute__((weak));
-    void GDALRegister_JPEG() __attribute__((weak));
-}
+#pragma weak GDALRegister_JP2OpenJPEG
+#pragma weak GDALRegister_PNG
+#pragma weak GDALRegister_JPEG
 
 namespace kor::datasources
 {

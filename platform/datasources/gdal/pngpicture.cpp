@@ -64,7 +64,7 @@ OwnedGdalDataset InMemory(const tessel::Raster& oRaster)
 class TemporaryFile
 {
 public:
-    explicit TemporaryFile(const std::string& oName) : moName(oName) {}
+    explicit TemporaryFile(std::string oName) : moName(std::move(oName)) {}
     TemporaryFile(const TemporaryFile&) = delete;
     TemporaryFile& operator=(const TemporaryFile&) = delete;
     ~TemporaryFile() { std::remove(moName.c_str()); }

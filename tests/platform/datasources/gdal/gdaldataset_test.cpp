@@ -474,7 +474,7 @@ TEST_F(GdalDatasetTest, EntryForAChannelThatDoesNotExistIsRefused)
     AuxiliaryData oOdd;
     oOdd.SetFileMetadata({{"a=b", "c"}});
     EXPECT_EQ(MessageOf<DataException>([&] { poDataset->SetAuxiliaryData(oOdd); }),
-              File("x.tif") + ": \"a=b\" cannot be the name of a metadata item");
+              File("x.tif") + ": \"a=b\" cannot be the name of a metadata item beside the others");
 }
 
 TEST_F(GdalDatasetTest, FileOpenedForReadingIsNotChanged)
@@ -752,7 +752,8 @@ TEST_F(GdalDatasetTest, DirectoryThatIsMissingIsReported)
 TEST_F(GdalDatasetTest, FormatsAndOptionsThatCannotBeAreRefusedByName)
 {
     EXPECT_EQ(MessageOf<DataException>([&] { New(File("x.png"), "PNG"); }),
-              File("x.png") + ": files of the format PNG can be read but not made block by block");
+              File("x.png") + ": files of the format PNG can be read but not made block by block; "
+                              "formats that can: GTiff ENVI EHdr HFA");
     EXPECT_TRUE(HasWord(MessageOf<DataException>([&] { New(File("x"), "Nothing"); }),
                         "no driver knows a format \"Nothing\""));
     EXPECT_TRUE(HasWord(MessageOf<DataException>([&] { New(File("x.tif"), "GTiff", "SPEED=MAX"); }),
