@@ -69,11 +69,15 @@ constexpr const char* kUsage =
 
 void PrintUsage(std::ostream& oStream)
 {
-    oStream << kUsage << "\nFilters:\n";
-    for (const examples::FilterEntry& oFilter : examples::GetFilters())
+    oStream << kUsage;
+    for (const examples::FilterGroup& oGroup : examples::GetFilterGroups())
     {
-        oStream << "  " << oFilter.moName << std::string(18 - oFilter.moName.size(), ' ')
-                << oFilter.moSummary << '\n';
+        oStream << '\n' << oGroup.moTitle << ":\n";
+        for (const examples::FilterEntry& oFilter : oGroup.moFilters)
+        {
+            oStream << "  " << oFilter.moName << std::string(18 - oFilter.moName.size(), ' ')
+                    << oFilter.moSummary << '\n';
+        }
     }
 }
 
@@ -138,9 +142,15 @@ public:
     }
 
     /// Hands on how the user wants the image to be seen.
-    void Prepare(parallelio::FilterAlgorithm& oAlgorithm) const
+    void Prepare(PreparedFilter& oFilter)
     {
+        parallelio::FilterAlgorithm& oAlgorithm = oFilter.moAlgorithm;
         oAlgorithm.SetMasksMissingData(!mbNoMask);
+        if (oFilter.mbNeedsMask && mpoMask == nullptr)
+        {
+            mpoMask = std::make_unique<filters::ValidMaskBuilder>(
+                mpoReader->GetAuxiliaryData().GetNoDataValues());
+        }
         oAlgorithm.SetMaskBuilder(mpoMask.get());
         if (mpoReader->GetDataType().mbComplex)
         {
@@ -297,9 +307,9 @@ int FilterFile(const std::string& oIn, const std::string& oOut, const std::strin
     const std::uint64_t nBudget =
         SplitMemory(oArguments.TakeInteger("memory", 256, 8, std::numeric_limits<int>::max()));
     datasources::RegisterGdalDriver();
-    const Source oSource(oIn, oArguments);
+    Source oSource(oIn, oArguments);
     PreparedFilter oFilter = oEntry.mpfnMake(oArguments, oSource.GetInfo());
-    oSource.Prepare(oFilter.moAlgorithm);
+    oSource.Prepare(oFilter);
     const RasterInfo oInfo = OutputInfo(oSource.GetInfo(), oFilter, oArguments);
     const std::string oFormat = oArguments.TakeText("format", "");
     const std::string oOptions = oArguments.TakeText("options", "");

@@ -43,16 +43,7 @@ Picture PictureOf(const std::string& oFile)
     std::iota(vnChannels.begin(), vnChannels.end(), 1U);
     datasources::MultiTypeReader oReader(poDataset.get(), vnChannels, tessel::eDT_64R);
 
-    std::vector<double> vdfNoData;
-    const datasources::AuxiliaryData oData = oReader.GetAuxiliaryData();
-    for (const auto& [nChannel, oChannel] : oData.GetChannels())
-    {
-        if (oChannel.mdfNoData)
-        {
-            vdfNoData.push_back(*oChannel.mdfNoData);
-        }
-    }
-    const filters::ValidMaskBuilder oMaskBuilder(vdfNoData);
+    const filters::ValidMaskBuilder oMaskBuilder(oReader.GetAuxiliaryData().GetNoDataValues());
     const tessel::RasterInfo oRow(oReader.GetWidth(), 1, oReader.GetChannelCount(),
                                   tessel::eDT_64R);
     Picture oPicture(

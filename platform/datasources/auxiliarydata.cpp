@@ -1,5 +1,7 @@
 #include "platform/datasources/auxiliarydata.h"
 
+#include <algorithm>
+
 #include "platform/exception/exception.h"
 
 namespace kor::datasources
@@ -54,6 +56,20 @@ void AuxiliaryData::SetChannelNoData(std::optional<double> dfNoData, unsigned in
 void AuxiliaryData::SetChannel(const Channel& oChannel, unsigned int nChannel)
 {
     EntryOf(nChannel) = oChannel;
+}
+
+std::vector<double> AuxiliaryData::GetNoDataValues() const
+{
+    std::vector<double> vdfValues;
+    for (const auto& [nChannel, oChannel] : moChannels)
+    {
+        if (oChannel.mdfNoData &&
+            std::find(vdfValues.begin(), vdfValues.end(), *oChannel.mdfNoData) == vdfValues.end())
+        {
+            vdfValues.push_back(*oChannel.mdfNoData);
+        }
+    }
+    return vdfValues;
 }
 
 }  // namespace kor::datasources

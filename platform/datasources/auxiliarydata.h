@@ -3,6 +3,7 @@
 #include <map>
 #include <optional>
 #include <string>
+#include <vector>
 
 namespace kor::datasources
 {
@@ -38,6 +39,8 @@ public:
     /// has no such value. A 64-bit integer value beyond 2^53 may be rounded on the way.
     std::optional<double> GetChannelNoData(unsigned int nChannel) const;
     void SetChannelNoData(std::optional<double> dfNoData, unsigned int nChannel);
+    /// The "no data" values of all channels, each once.
+    std::vector<double> GetNoDataValues() const;
 
     Metadata GetFileMetadata() const { return moFileMetadata; }
     void SetFileMetadata(const Metadata& oMetadata) { moFileMetadata = oMetadata; }

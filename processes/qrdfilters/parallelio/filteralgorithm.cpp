@@ -101,15 +101,7 @@ const tessel::IMaskBuilder* FilterAlgorithm::GetMaskBuilder() const
 void FilterAlgorithm::LookForMissingData(const datasources::IRasterAccess& oReader)
 {
     mpoMissingData.reset();
-    const datasources::AuxiliaryData oData = oReader.GetAuxiliaryData();
-    std::vector<double> vdfNoData;
-    for (const auto& [nChannel, oChannel] : oData.GetChannels())
-    {
-        if (oChannel.mdfNoData)
-        {
-            vdfNoData.push_back(*oChannel.mdfNoData);
-        }
-    }
+    std::vector<double> vdfNoData = oReader.GetAuxiliaryData().GetNoDataValues();
     if (mbMasksMissingData && (oReader.GetDataType().mbFloat || !vdfNoData.empty()))
     {
         mpoMissingData = std::make_shared<filters::ValidMaskBuilder>(std::move(vdfNoData));

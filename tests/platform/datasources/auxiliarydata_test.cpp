@@ -43,5 +43,16 @@ TEST(AuxiliaryData, ChannelsAreNumberedFromOne)
               "nChannel is 0; channels are numbered from 1");
 }
 
+TEST(AuxiliaryData, NoDataValuesOfAllChannelsAreListedOnce)
+{
+    AuxiliaryData oData;
+    EXPECT_TRUE(oData.GetNoDataValues().empty());
+    oData.SetChannelNoData(-1.0, 3);
+    oData.SetChannelNoData(7.0, 1);
+    oData.SetChannelNoData(7.0, 2);
+    oData.SetChannelDescription("without", 4);
+    EXPECT_EQ(oData.GetNoDataValues(), (std::vector<double>{7.0, -1.0}));
+}
+
 }  // namespace
 }  // namespace kor::datasources
