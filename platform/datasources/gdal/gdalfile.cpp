@@ -9,6 +9,7 @@
 
 #include "platform/datasources/datatypename.h"
 #include "platform/datasources/gdal/gdalformats.h"
+#include "platform/datasources/gdal/gdalrawfile.h"
 #include "platform/datasources/gdal/gdaltypes.h"
 #include "platform/exception/exception.h"
 #include "platform/fileio/file.h"
@@ -232,13 +233,18 @@ std::shared_ptr<GdalFile> GdalFile::Create(const std::string& oFile, const std::
         throw FileException(oFile + ": cannot make the file: " + oErrors.GetText(), oFile, kSource,
                             __PRETTY_FUNCTION__, __LINE__);
     }
-    const std::string oUnexpected = UnexpectedType(hDriver, poDataset.get(), oInfo.moDataType);
+    std::string oUnexpected = UnexpectedType(hDriver, poDataset.get(), oInfo.moDataType);
+    if (oUnexpected.empty())
+    {
+        oUnexpected = UnwritableRawFile(poDataset.get(), oFile);
+    }
     if (!oUnexpected.empty())
     {
         poDataset.reset();
         RemoveFiles(voCompanions);
         ThrowData(oFile, oUnexpected, __PRETTY_FUNCTION__, __LINE__);
     }
+    CompleteRawFile(poDataset.get(), oFile);
     return std::shared_ptr<GdalFile>(new GdalFile(std::move(poDataset), oFile, true));
 }
 
