@@ -1,8 +1,6 @@
 #include <gtest/gtest.h>
-#include <sys/wait.h>
 
 #include <cstdint>
-#include <cstdlib>
 #include <filesystem>
 #include <set>
 #include <string>
@@ -11,6 +9,7 @@
 #include "platform/datasources/datasetmanager.h"
 #include "platform/datasources/gdal/gdaldriver.h"
 #include "tests/support/blocks.h"
+#include "tests/support/exampleprogram.h"
 #include "tests/support/temporarydirectory.h"
 
 namespace kor::test
@@ -33,14 +32,7 @@ protected:
     }
 
     /// Runs the demo on oFile and gives its exit status; what it says goes to "out" and "err".
-    int Run(const std::string& oFile) const
-    {
-        const std::string oCommand = std::string(KOR_DEMO) + " '" + oFile + "' '" + Result("") +
-                                     "' >'" + moFolder.File("out") + "' 2>'" +
-                                     moFolder.File("err") + "'";
-        const int nStatus = std::system(oCommand.c_str());
-        return WIFEXITED(nStatus) ? WEXITSTATUS(nStatus) : -1;
-    }
+    int Run(const std::string& oFile) const { return RunExample({oFile, Result("")}, moFolder); }
 
     std::string Result(const std::string& oName) const { return moFolder.File("results/" + oName); }
     std::string Said() const { return BytesOf(moFolder.File("out")); }
