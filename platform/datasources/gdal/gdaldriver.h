@@ -24,7 +24,8 @@ namespace kor::datasources
 ///
 /// Reading     each reader has a handle of its own on a file opened for reading. On a file that is
 ///             being written, all readers and writers take turns at one handle.
-/// Samples     are never converted by GDAL. 8-bit bands marked as signed bytes are eDT_8S.
+/// Samples     are never converted by GDAL. 8-bit bands marked as signed bytes are eDT_8S. A sample
+///             that the option NBITS leaves too few bits for is refused (kor::IOException).
 /// Changing    files of GTiff, ENVI, EHdr and HFA can be opened for changing, others are refused
 /// then.
 ///             Descriptions, no-data values, metadata and georeferencing that a format has no place

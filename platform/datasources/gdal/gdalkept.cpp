@@ -175,8 +175,8 @@ std::string NotKept(const AuxiliaryData& oAsked, const AuxiliaryData& oBefore,
             return Difference("the no-data value of channel " + oNumber, TextOf(oChannel.mdfNoData),
                               TextOf(dfNoData));
         }
-        const std::string oItem = NotKept(oChannel.moMetadata, oBefore.GetChanMetadata(nChannel),
-                                          oNow.GetChanMetadata(nChannel), " of channel " + oNumber);
+        std::string oItem = NotKept(oChannel.moMetadata, oBefore.GetChanMetadata(nChannel),
+                                    oNow.GetChanMetadata(nChannel), " of channel " + oNumber);
         if (!oItem.empty())
         {
             return oItem;

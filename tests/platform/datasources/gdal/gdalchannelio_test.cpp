@@ -15,6 +15,7 @@ namespace kor::datasources
 namespace
 {
 
+using test::MessageOf;
 using test::Random;
 using test::RandomRaster;
 using test::SameBits;
@@ -226,6 +227,46 @@ TEST_F(GdalChannelIOTest, ImagesOfOneRowColumnAndPixelHoldTheirSamples)
             std::filesystem::remove(oFile);
         }
     }
+}
+
+TEST_F(GdalChannelIOTest, SamplesOfMoreBitsThanTheChannelHasAreRefused)
+{
+    const auto oMessage =
+        [&]<class T>(const std::string& oFormat, const std::string& oBits, T nFits, T nMore)
+    {
+        moDirectory.Clear();
+        const auto poDataset = New(File("x.img"), oFormat, "NBITS=" + oBits);
+        const auto poFitting = test::RasterOf(test::Image<T>{{0, nFits}});
+        poDataset->CreateChannels(*poFitting);
+        BasicWriter oWriter(poDataset.get(), {1});
+        oWriter.WriteRaster(poFitting.get());
+        const auto poTooLarge = test::RasterOf(test::Image<T>{{0, nMore}});
+        const std::string oText =
+            MessageOf<IOException>([&] { oWriter.WriteRaster(poTooLarge.get()); });
+        poDataset->Flush();
+        EXPECT_TRUE(SameBits(*ReadFile(File("x.img")), *poFitting)) << oFormat << " " << oBits;
+        return oText;
+    };
+    EXPECT_EQ(oMessage("GTiff", "1", std::uint8_t{1}, std::uint8_t{2}),
+              File("x.img") + ": channel 1 has 1 bits a sample (NBITS) and cannot hold 2");
+    EXPECT_EQ(oMessage("HFA", "4", std::uint8_t{15}, std::uint8_t{16}),
+              File("x.img") + ": channel 1 has 4 bits a sample (NBITS) and cannot hold 16");
+    EXPECT_EQ(oMessage("GTiff", "12", std::uint16_t{4095}, std::uint16_t{4096}),
+              File("x.img") + ": channel 1 has 12 bits a sample (NBITS) and cannot hold 4096");
+    EXPECT_EQ(oMessage("GTiff", "24", std::uint32_t{0xFFFFFF}, std::uint32_t{0x1000000}),
+              File("x.img") + ": channel 1 has 24 bits a sample (NBITS) and cannot hold 16777216");
+}
+
+TEST_F(GdalChannelIOTest, FloatsOfFewerBitsAreNotWritten)
+{
+    const auto poDataset = New(File("x.tif"), "GTiff", "NBITS=16");
+    poDataset->CreateChannels({2, 1, 1, tessel::eDT_32R});
+    BasicWriter oWriter(poDataset.get(), {1});
+    const auto poRaster = test::RasterOf(test::Image<float>{{0, 1}});
+    EXPECT_EQ(MessageOf<IOException>([&] { oWriter.WriteRaster(poRaster.get()); }),
+              File("x.tif") +
+                  ": channel 1 has 16 bits a sample (NBITS), too few for floating "
+                  "point to be written as it is");
 }
 
 // The block driver, with so little memory that blocks are a few tiles or rows, from each layout to
