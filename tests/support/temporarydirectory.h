@@ -48,6 +48,18 @@ public:
         return oNames;
     }
 
+    /// Removes the files in it whose names begin like that.
+    void Clear(const std::string& oStart = "") const
+    {
+        for (const std::string& oName : Names())
+        {
+            if (oName.starts_with(oStart))
+            {
+                std::filesystem::remove(moPath / oName);
+            }
+        }
+    }
+
 private:
     std::filesystem::path moPath;
 };

@@ -18,6 +18,7 @@ struct GdalLayout
     int mnWidth = 0;
     int mnHeight = 0;
     std::vector<GDALDataType> mveTypes;
+    std::vector<int> mvnBits;  ///< of a sample in the file where it has fewer there, else 0
 
     bool operator==(const GdalLayout&) const = default;
 };
@@ -37,6 +38,10 @@ public:
                const unsigned char* pSamples, const SampleStrides& oStrides) override;
 
 private:
+    /// Throws kor::IOException when a sample has more bits than its channel: GDAL would write
+    /// another.
+    void RequireFittingSamples(unsigned int nChannel, const PixelWindow& oWindow,
+                               const unsigned char* pSamples, const SampleStrides& oStrides) const;
     bool Transfer(GDALDatasetH hDataset, GDALRWFlag eDirection,
                   std::span<const unsigned int> oChannels, const PixelWindow& oWindow,
                   unsigned char* pSamples, const SampleStrides& oStrides) const;

@@ -1,7 +1,6 @@
 #include "platform/datasources/gdal/gdaldataset.h"
 
 #include <fcntl.h>
-#include <gdal_priv.h>
 #include <unistd.h>
 
 #include <algorithm>
@@ -13,6 +12,7 @@
 #include "platform/datasources/datatypename.h"
 #include "platform/datasources/gdal/gdalauxiliary.h"
 #include "platform/datasources/gdal/gdalkept.h"
+#include "platform/datasources/gdal/gdalrawfile.h"
 #include "platform/datasources/gdal/gdaltypes.h"
 #include "platform/exception/exception.h"
 
@@ -64,31 +64,6 @@ std::string SizeText(unsigned int nWidth, unsigned int nHeight)
     return std::to_string(nWidth) + " x " + std::to_string(nHeight);
 }
 
-/// Some drivers read zeros behind the end of a file of plain samples without an error.
-void RequireWholeFile(GDALDatasetH hDataset, const GdalLayout& oLayout, const std::string& oFile)
-{
-    GDALDataset::RawBinaryLayout oRaw;
-    if (oLayout.mveTypes.empty() || !GDALDataset::FromHandle(hDataset)->GetRawBinaryLayout(oRaw))
-    {
-        return;
-    }
-    const auto oSpan = [](GIntBig nStep, std::size_t nCount)
-    { return static_cast<std::uint64_t>(std::max<GIntBig>(nStep, 0)) * (nCount - 1); };
-    const std::uint64_t nNeeded =
-        oRaw.nImageOffset + oSpan(oRaw.nLineOffset, static_cast<std::size_t>(oLayout.mnHeight)) +
-        oSpan(oRaw.nPixelOffset, static_cast<std::size_t>(oLayout.mnWidth)) +
-        oSpan(oRaw.nBandOffset, oLayout.mveTypes.size()) +
-        static_cast<std::uint64_t>(GDALGetDataTypeSizeBytes(oRaw.eDataType));
-    std::error_code oError;
-    const std::uint64_t nBytes = std::filesystem::file_size(oRaw.osRawFilename, oError);
-    if (!oError && nBytes < nNeeded)
-    {
-        throw FileException(oFile + ": the file is cut off: it has " + std::to_string(nBytes) +
-                                " bytes and its header tells of " + std::to_string(nNeeded),
-                            oFile, kSource, __PRETTY_FUNCTION__, __LINE__);
-    }
-}
-
 }  // namespace
 
 GdalDataset::GdalDataset(const std::string& oFile, bool bUpdate)
@@ -99,7 +74,7 @@ GdalDataset::GdalDataset(const std::string& oFile, bool bUpdate)
                 [&](GDALDatasetH hDataset)
                 {
                     RequireSaneTiles(hDataset, moFile);
-                    RequireWholeFile(hDataset, moLayout, moFile);
+                    RequireWholeRawFile(hDataset, moFile);
                     return true;
                 });
 }
@@ -217,11 +192,27 @@ std::unique_ptr<IChannelIO> GdalDataset::OpenChannels(bool bWrite)
     if (bWrite)
     {
         RequireUpdate("cannot write pixels");
+        RequireWritablePixels();
     }
     // A second handle on a file that is being changed would see old pixels, so all share the one.
     const bool bShared = mpoFile && mpoFile->IsUpdate();
     return std::make_unique<GdalChannelIO>(bShared ? mpoFile : GdalFile::Open(moFile, false),
                                            moLayout);
+}
+
+void GdalDataset::RequireWritablePixels() const
+{
+    std::string oReason;
+    mpoFile->Do("cannot look at the channels",
+                [&](GDALDatasetH hDataset)
+                {
+                    oReason = UnwritableRawFile(hDataset, moFile);
+                    return true;
+                });
+    if (!oReason.empty())
+    {
+        throw DataException(moFile + ": " + oReason, kSource, __PRETTY_FUNCTION__, __LINE__);
+    }
 }
 
 AuxiliaryData GdalDataset::GetAuxiliaryData() const

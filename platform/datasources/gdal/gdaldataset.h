@@ -56,6 +56,7 @@ private:
     void TakeLayout();
     void TakeGeocoding();
     void RequireUpdate(const char* pszTask) const;
+    void RequireWritablePixels() const;
     /// Throws kor::DataException, once oPutBack has run, when oNotKept names something that the
     /// file does not hold as it was just told to.
     void RequireKept(const std::function<std::string()>& oNotKept,

@@ -55,18 +55,13 @@ public:
     bool AllowFormat(const std::string& oFormat) override { return AllowGdalFormat(oFormat); }
 };
 
-bool CanMake(GDALDriverH hDriver)
-{
-    return hDriver != nullptr && GDALGetMetadataItem(hDriver, GDAL_DCAP_CREATE, nullptr) != nullptr;
-}
-
 /// Each behind a blank.
 std::string FormatsThatCanBeMade()
 {
     std::string oFormats;
     for (const std::string& oFormat : AllowedFormats())
     {
-        oFormats += CanMake(GDALGetDriverByName(oFormat.c_str())) ? " " + oFormat : "";
+        oFormats += CanMakeFiles(GDALGetDriverByName(oFormat.c_str())) ? " " + oFormat : "";
     }
     return oFormats;
 }
@@ -93,7 +88,7 @@ std::unique_ptr<IDataset> GdalDriver::Create(const std::string& oFile, const std
 {
     const GdalErrors oErrors;
     GDALDriverH hDriver = GDALGetDriverByName(oFormat.c_str());
-    if (!CanMake(hDriver))
+    if (!CanMakeFiles(hDriver))
     {
         throw DataException(oFile + ": files of the format " + oFormat +
                                 " can be read but not made block by block; formats that can:" +

@@ -24,8 +24,10 @@ namespace kor::datasources
 ///
 /// Reading     each reader has a handle of its own on a file opened for reading. On a file that is
 ///             being written, all readers and writers take turns at one handle.
-/// Samples     are never converted by GDAL. 8-bit bands marked as signed bytes are eDT_8S.
-/// Changing    files of GTiff, ENVI, EHdr and HFA can be opened for changing, others are refused then.
+/// Samples     are never converted by GDAL. 8-bit bands marked as signed bytes are eDT_8S. A sample
+///             that the option NBITS leaves too few bits for is refused (kor::IOException).
+/// Changing    files of GTiff, ENVI, EHdr and HFA can be opened for changing, others are refused
+/// then.
 ///             Descriptions, no-data values, metadata and georeferencing that a format has no place
 ///             for go to NAME.aux.xml beside a file that is made or changed, never beside one that
 ///             is read. What does not come back from the file as it was set (ENVI and EHdr hold no
@@ -33,6 +35,8 @@ namespace kor::datasources
 ///             refused with kor::DataException, and the old one stays. Texts that begin with a
 ///             blank or have control characters in them are refused, as are names of metadata items
 ///             with '=' or ':' or that differ from another in capital letters alone.
+///             Pixels of files of plain samples with several channels side by side (ENVI with
+///             INTERLEAVE=BIP) are read and never written: GDAL loses some on the way.
 /// Tiles       of readers and writers are the file's own: tiles, or strips as wide as the image.
 /// No data     GTiff has one value for the whole file: a second, different one is refused, and
 ///             channels that were given none show it too when the file is opened again. Blocks of a

@@ -9,6 +9,7 @@
 
 #include "platform/datasources/datatypename.h"
 #include "platform/datasources/gdal/gdalformats.h"
+#include "platform/datasources/gdal/gdalrawfile.h"
 #include "platform/datasources/gdal/gdaltypes.h"
 #include "platform/exception/exception.h"
 #include "platform/fileio/file.h"
@@ -170,6 +171,16 @@ void RemoveFiles(const std::vector<std::string>& voCompanions)
     }
 }
 
+/// The format of a file that can be made as a whole alone, empty when it is another. Some drivers
+/// let such a file be opened for changing and fail, or lose what was changed, later.
+std::string UnchangeableFormatOf(const std::string& oFile)
+{
+    GDALDriverH hDriver = GDALIdentifyDriverEx(GdalName(oFile).c_str(), GDAL_OF_RASTER,
+                                               StringListOf(AllowedFormats()).List(), nullptr);
+    return hDriver == nullptr || CanMakeFiles(hDriver) ? std::string()
+                                                       : GDALGetDriverShortName(hDriver);
+}
+
 }  // namespace
 
 void CloseGdalDataset::operator()(void* hDataset) const
@@ -189,12 +200,20 @@ GdalFile::GdalFile(OwnedGdalDataset poDataset, std::string oFile, bool bUpdate)
 std::shared_ptr<GdalFile> GdalFile::Open(const std::string& oFile, bool bUpdate)
 {
     const GdalErrors oErrors;
-    OwnedGdalDataset poDataset = OpenHandle(oFile, bUpdate, AllowedFormats());
+    const std::string oUnchangeable = bUpdate ? UnchangeableFormatOf(oFile) : std::string();
+    OwnedGdalDataset poDataset;
+    if (oUnchangeable.empty())
+    {
+        poDataset = OpenHandle(oFile, bUpdate, AllowedFormats());
+    }
     if (!poDataset)
     {
-        throw FileException(oFile + ": cannot open the file" + (bUpdate ? " for changing" : "") +
-                                ": " + oErrors.GetText(),
-                            oFile, kSource, __PRETTY_FUNCTION__, __LINE__);
+        throw FileException(
+            oFile + ": cannot open the file" + (bUpdate ? " for changing" : "") + ": " +
+                (oUnchangeable.empty() ? oErrors.GetText()
+                                       : "files of the format " + oUnchangeable +
+                                             " can be read but not changed block by block"),
+            oFile, kSource, __PRETTY_FUNCTION__, __LINE__);
     }
     return std::shared_ptr<GdalFile>(new GdalFile(std::move(poDataset), oFile, bUpdate));
 }
@@ -232,13 +251,18 @@ std::shared_ptr<GdalFile> GdalFile::Create(const std::string& oFile, const std::
         throw FileException(oFile + ": cannot make the file: " + oErrors.GetText(), oFile, kSource,
                             __PRETTY_FUNCTION__, __LINE__);
     }
-    const std::string oUnexpected = UnexpectedType(hDriver, poDataset.get(), oInfo.moDataType);
+    std::string oUnexpected = UnexpectedType(hDriver, poDataset.get(), oInfo.moDataType);
+    if (oUnexpected.empty())
+    {
+        oUnexpected = UnwritableRawFile(poDataset.get(), oFile);
+    }
     if (!oUnexpected.empty())
     {
         poDataset.reset();
         RemoveFiles(voCompanions);
         ThrowData(oFile, oUnexpected, __PRETTY_FUNCTION__, __LINE__);
     }
+    CompleteRawFile(poDataset.get(), oFile);
     return std::shared_ptr<GdalFile>(new GdalFile(std::move(poDataset), oFile, true));
 }
 

@@ -94,6 +94,11 @@ bool AllowGdalFormat(const std::string& oFormat)
     return true;
 }
 
+bool CanMakeFiles(GDALDriverH hDriver)
+{
+    return hDriver != nullptr && GDALGetMetadataItem(hDriver, GDAL_DCAP_CREATE, nullptr) != nullptr;
+}
+
 std::string GdalName(const std::string& oFile)
 {
     if (oFile.starts_with("/vsi"))

@@ -18,6 +18,9 @@ std::vector<std::string> AllowedFormats();
 /// Adds one; false when GDAL has no such raster format. Throws kor::DataException for VRT.
 bool AllowGdalFormat(const std::string& oFormat);
 
+/// True when the driver, which may be null, makes files block by block.
+bool CanMakeFiles(GDALDriverH hDriver);
+
 /// The name by which GDAL takes oFile for a file and nothing else. Throws kor::FileException for a
 /// name that it would take for a virtual file.
 std::string GdalName(const std::string& oFile);

@@ -21,9 +21,9 @@ using ogc::cs::GeocodingInfo;
 constexpr const char* kSource = "platform/datasources/gdal/gdalkept";
 constexpr double kSameCorner = 1e-6;  ///< pixels
 
-bool IsBlank(char cLetter)
+bool IsBlank(char nLetter)
 {
-    return cLetter == ' ' || cLetter == '\t' || cLetter == '\n' || cLetter == '\r';
+    return nLetter == ' ' || nLetter == '\t' || nLetter == '\n' || nLetter == '\r';
 }
 
 /// XML, in which most formats keep texts, has no other control characters, and GDAL's reader drops
@@ -32,8 +32,8 @@ bool IsKeepable(const std::string& oText)
 {
     return (oText.empty() || !IsBlank(oText.front())) &&
            std::none_of(oText.begin(), oText.end(),
-                        [](char cLetter)
-                        { return static_cast<unsigned char>(cLetter) < ' ' && !IsBlank(cLetter); });
+                        [](char nLetter)
+                        { return static_cast<unsigned char>(nLetter) < ' ' && !IsBlank(nLetter); });
 }
 
 /// GDAL takes a colon for the end of a name as well, drops blanks behind one, and does not tell
@@ -175,8 +175,8 @@ std::string NotKept(const AuxiliaryData& oAsked, const AuxiliaryData& oBefore,
             return Difference("the no-data value of channel " + oNumber, TextOf(oChannel.mdfNoData),
                               TextOf(dfNoData));
         }
-        const std::string oItem = NotKept(oChannel.moMetadata, oBefore.GetChanMetadata(nChannel),
-                                          oNow.GetChanMetadata(nChannel), " of channel " + oNumber);
+        std::string oItem = NotKept(oChannel.moMetadata, oBefore.GetChanMetadata(nChannel),
+                                    oNow.GetChanMetadata(nChannel), " of channel " + oNumber);
         if (!oItem.empty())
         {
             return oItem;

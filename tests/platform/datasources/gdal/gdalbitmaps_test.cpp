@@ -421,6 +421,52 @@ TEST_F(GdalBitmapsTest, MaskHasNoAuxiliaryDataOfItsOwn)
                   "no-data value or metadata of its own");
 }
 
+TEST_F(GdalBitmapsTest, DamagedFilesDoNoHarm)
+{
+    Random oRandom(34);
+    {
+        const auto poDataset =
+            New(File("x.tif"), "GTiff", "TILED=YES BLOCKXSIZE=16 BLOCKYSIZE=16 COMPRESS=DEFLATE");
+        poDataset->CreateChannels({40, 40, 1, tessel::eDT_8U});
+        BitmapsIn(poDataset)->CreateBitmap(40, 40);
+        BasicWriter oWriter(BitmapsIn(poDataset), 1);
+        const auto poBits =
+            test::RandomRaster(40, 40, 1, tessel::eDT_8U, {}, test::Samples::Ordinary, oRandom);
+        oWriter.WriteRaster(poBits.get());
+    }
+    const std::string oWhole = test::BytesOf(File("x.tif"));
+    int nRead = 0;
+    for (int i = 0; i < 200; ++i)
+    {
+        std::string oBytes = oWhole;
+        for (int k = 0; k < 3; ++k)
+        {
+            oBytes[oRandom() % oBytes.size()] = static_cast<char>(oRandom());
+        }
+        if (i % 10 == 9)
+        {
+            oBytes.resize(oRandom() % oBytes.size());
+        }
+        const std::string oFile = moDirectory.Write("y.tif", oBytes);
+        try
+        {
+            const auto poDataset = Open(oFile, false);
+            for (unsigned int n = 1; n <= BitmapsIn(poDataset)->GetBitmapCount(); ++n)
+            {
+                BitmapReader oReader(BitmapsIn(poDataset), n);
+                oReader.SetTileSize(40, 40);
+                delete oReader.GetRaster(0);
+                ++nRead;
+            }
+        }
+        catch (const Exception& oError)
+        {
+            EXPECT_TRUE(std::string(oError.what()).starts_with(oFile)) << oError.what();
+        }
+    }
+    EXPECT_GT(nRead, 0);
+}
+
 TEST_F(GdalBitmapsTest, FullDiskIsReportedAtTheLatestByFlush)
 {
     const auto poDataset = New(File("x.tif"));

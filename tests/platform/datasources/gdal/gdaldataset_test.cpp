@@ -63,7 +63,7 @@ TEST_F(GdalDatasetTest, SamplesComeBackThroughEveryFormatThatCanBeMade)
         {"GTiff", "COMPRESS=LZW PREDICTOR=2"},
         {"GTiff", "BIGTIFF=YES TILED=YES"},
         {"ENVI", ""},
-        {"ENVI", "INTERLEAVE=BIP"},
+        {"ENVI", "INTERLEAVE=BIL"},
         {"EHdr", ""},
         {"HFA", ""}};
     for (std::size_t i = 0; i < voFormats.size(); ++i)
@@ -752,8 +752,9 @@ TEST_F(GdalDatasetTest, DirectoryThatIsMissingIsReported)
 TEST_F(GdalDatasetTest, FormatsAndOptionsThatCannotBeAreRefusedByName)
 {
     EXPECT_EQ(MessageOf<DataException>([&] { New(File("x.png"), "PNG"); }),
-              File("x.png") + ": files of the format PNG can be read but not made block by block; "
-                              "formats that can: GTiff ENVI EHdr HFA");
+              File("x.png") +
+                  ": files of the format PNG can be read but not made block by block; "
+                  "formats that can: GTiff ENVI EHdr HFA");
     EXPECT_TRUE(HasWord(MessageOf<DataException>([&] { New(File("x"), "Nothing"); }),
                         "no driver knows a format \"Nothing\""));
     EXPECT_TRUE(HasWord(MessageOf<DataException>([&] { New(File("x.tif"), "GTiff", "SPEED=MAX"); }),

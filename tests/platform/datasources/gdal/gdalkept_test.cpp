@@ -79,14 +79,6 @@ protected:
         EXPECT_EQ(oMessage.substr(0, oStart.size()), oStart);
         return oMessage.substr(std::min(oMessage.size(), oStart.size()));
     }
-    void RemoveAll() const
-    {
-        for (const std::string& oName : moDirectory.Names())
-        {
-            std::filesystem::remove(File(oName));
-        }
-    }
-
     void ExpectPlace(const GeocodingInfo& oExpected, const std::string& oFormat) const
     {
         const GeocodingInfo oInfo = Geocoding();
@@ -132,7 +124,7 @@ TEST_F(GdalKeptTest, AllIsSetAndChangedInFilesThatAreThere)
             ExpectPlace(oPlace, oFormat);
         }
         EXPECT_TRUE(SameBits(*ReadFile(File("x.img")), *poPixels)) << oFormat;
-        RemoveAll();
+        moDirectory.Clear();
     }
 }
 
@@ -156,7 +148,7 @@ TEST_F(GdalKeptTest, AllIsSetBeforeThePixelsAreWritten)
         EXPECT_EQ(Data().GetChannelNoData(1), 7.0) << oFormat;
         ExpectPlace(kPlace, oFormat);
         EXPECT_TRUE(SameBits(*ReadFile(File("x.img")), *poPixels)) << oFormat;
-        RemoveAll();
+        moDirectory.Clear();
     }
 }
 
@@ -168,14 +160,14 @@ TEST_F(GdalKeptTest, WhatAFileOfOneFormatSaysGoesIntoEveryOther)
         Make(oFrom);
         const AuxiliaryData oData = Data();
         const GeocodingInfo oInfo = Geocoding();
-        RemoveAll();
+        moDirectory.Clear();
         for (const std::string& oTo : kFormats)
         {
             Make(oTo);
             Set(oData);
             Set(oInfo);
             EXPECT_EQ(Data().GetChannelNoData(1), std::nullopt) << oFrom << " to " << oTo;
-            RemoveAll();
+            moDirectory.Clear();
         }
     }
 }
@@ -196,12 +188,12 @@ TEST_F(GdalKeptTest, ValueThatAFormatDoesNotTakeBackIsRefusedAndTheOldOneStays)
     Make("ENVI");
     Set(SomeData(7.0));
     EXPECT_EQ(Refusal("ENVI", oNoNoData), "the no-data value of channel 1: 7 comes back for none");
-    RemoveAll();
+    moDirectory.Clear();
 
     Make("EHdr");
     Set(SomeData(7.0));
     EXPECT_EQ(Refusal("EHdr", SomeData(8.0)), "the no-data value of channel 1: 7 comes back for 8");
-    RemoveAll();
+    moDirectory.Clear();
 
     Make("HFA");
     Set(SomeData(7.0));
@@ -219,7 +211,7 @@ TEST_F(GdalKeptTest, PlaceThatAFormatCannotSayIsRefusedAndTheOldOneStays)
     Make("GTiff");
     Set(kTurned);
     ExpectPlace(kTurned, "GTiff");
-    RemoveAll();
+    moDirectory.Clear();
     for (const std::string oFormat : {"ENVI", "EHdr", "HFA"})
     {
         const auto poPixels = Make(oFormat);
@@ -229,7 +221,7 @@ TEST_F(GdalKeptTest, PlaceThatAFormatCannotSayIsRefusedAndTheOldOneStays)
             << oFormat;
         ExpectPlace(kPlace, oFormat);
         EXPECT_TRUE(SameBits(*ReadFile(File("x.img")), *poPixels)) << oFormat;
-        RemoveAll();
+        moDirectory.Clear();
     }
 }
 
@@ -309,7 +301,7 @@ TEST_F(GdalKeptTest, OtherTextsComeBackLetterByLetter)
             EXPECT_EQ(Data().GetChanMetadata(1).at("a b"), oText) << oFormat;
             EXPECT_EQ(Data().GetFileMetadata().at("a b"), oText) << oFormat;
         }
-        RemoveAll();
+        moDirectory.Clear();
     }
 }
 
