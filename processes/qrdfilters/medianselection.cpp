@@ -84,7 +84,7 @@ template <class T>
 void MedianSelection<T>::DropWholeWindows(std::uint32_t y, std::span<unsigned char> oWanted) const
 {
     std::vector<unsigned char> vWhole(oWanted.size());
-    FindWholeWindows(*mpoValid, moIn.mnMarginX, moIn.mnMarginY, y, vWhole);
+    FindWholeWindows(*mpoValid, moIn.mnMarginX, moIn.mnMarginY, 0, y, vWhole);
     std::transform(oWanted.begin(), oWanted.end(), vWhole.begin(), oWanted.begin(),
                    [](unsigned char nWanted, unsigned char nWhole)
                    { return static_cast<unsigned char>(nWanted & ~nWhole); });

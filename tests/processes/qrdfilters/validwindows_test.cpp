@@ -17,7 +17,7 @@ std::vector<int> WholeWindows(const tessel::Raster& oValid, std::size_t nHalfX, 
                               std::int64_t y)
 {
     std::vector<unsigned char> vWhole(oValid.mnWidth, 7);
-    FindWholeWindows(oValid, nHalfX, nHalfY, y, vWhole);
+    FindWholeWindows(oValid, nHalfX, nHalfY, 0, y, vWhole);
     return std::vector<int>(vWhole.begin(), vWhole.end());
 }
 
@@ -37,6 +37,15 @@ TEST(FindWholeWindows, FindsTheWindowsWithoutAMaskedPixel)
     EXPECT_EQ(WholeWindows(*poValid, 0, 1, 0), (std::vector<int>{1, 0, 1, 1, 1}));
     EXPECT_EQ(WholeWindows(*poValid, 1, 0, 0), (std::vector<int>{1, 1, 1, 1, 1}));
     EXPECT_EQ(WholeWindows(*poValid, 0, 0, 1), (std::vector<int>{1, 0, 1, 1, 1}));
+}
+
+TEST(FindWholeWindows, BeginsAtAnyPixelOfTheRow)
+{
+    const auto poMask = MaskOf({{1, 1, 1, 0, 1, 1, 1}}, Margins{1, 0});
+    const std::unique_ptr<tessel::Raster> poValid(poMask->CreateRaster());
+    std::vector<unsigned char> vWhole(2, 7);
+    FindWholeWindows(*poValid, 1, 0, 3, 0, vWhole);
+    EXPECT_EQ(vWhole, (std::vector<unsigned char>{0, 1}));
 }
 
 TEST(FindWholeWindows, AgreesWithLookingAtEachPixel)

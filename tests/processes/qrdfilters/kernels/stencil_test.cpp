@@ -8,6 +8,7 @@
 
 #include "processes/qrdfilters/kernels/correlaterows.h"
 #include "processes/qrdfilters/kernels/edgerows.h"
+#include "processes/qrdfilters/kernels/gaussrows.h"
 #include "processes/qrdfilters/kernels/gradientrows.h"
 #include "tests/support/blocks.h"
 
@@ -245,6 +246,75 @@ TEST_P(StencilKernels, GradientsAreAddedFromTheLeft)
         };
         constexpr Window kThree[] = {{3, 3}};
         ForEachCase(kThree, bMasked, oTest);
+    }
+}
+
+double Smoothed(const Rows& oRows, std::size_t i, std::span<const double> oKernel)
+{
+    const std::size_t nHalf = oKernel.size() - 1;
+    const auto oAt = [&](std::size_t dx, std::size_t dy)
+    { return oRows.Valid(i, 0, dx, dy) ? oRows.Sample(i, 0, dx, dy) : oRows.Centre(i, 0); };
+    std::vector<double> vdfColumns(2 * nHalf + 1, 0.0);
+    for (std::size_t x = 0; x <= 2 * nHalf; ++x)
+    {
+        for (std::size_t y = 0; y < nHalf; ++y)
+        {
+            vdfColumns[x] += (oAt(x, y) + oAt(x, 2 * nHalf - y)) * oKernel[y];
+        }
+        vdfColumns[x] += oKernel[nHalf] * oAt(x, nHalf);
+    }
+    double dfSum = 0.0;
+    for (std::size_t x = 0; x < nHalf; ++x)
+    {
+        dfSum += (vdfColumns[x] + vdfColumns[2 * nHalf - x]) * oKernel[x];
+    }
+    return dfSum + oKernel[nHalf] * vdfColumns[nHalf];
+}
+
+TEST_P(StencilKernels, SmoothingAddsMirroredSamplesFirst)
+{
+    constexpr Window kSquares[] = {{3, 3}, {5, 5}, {11, 11}};
+    const std::vector<double> vdfFirst = {0.3, -0.1, 0.2, 0.25, 0.01, 0.7};
+    const std::vector<double> vdfSecond = {0.5, 0.15, 0.6, -0.3, 0.2, 0.1};
+    for (unsigned int nCase = 0; nCase < 4; ++nCase)
+    {
+        const bool bMasked = (nCase & 1U) != 0;
+        const bool bTwo = (nCase & 2U) != 0;
+        for (const Window oWindow : kSquares)
+        {
+            for (std::size_t nSamples = 1; nSamples <= 24; ++nSamples)
+            {
+                const Rows oRows(1, nSamples, 1 + moRandom() % 4, oWindow, bMasked, moRandom);
+                const std::size_t nWeights = oWindow.nWidth / 2 + 1;
+                GaussKernels oKernels{{vdfFirst.data(), nWeights}, {}};
+                if (bTwo)
+                {
+                    oKernels.moSecond = {vdfSecond.data(), nWeights};
+                }
+                const StencilRows& oGiven = oRows.Get();
+                const std::size_t nColumns = nSamples + (oWindow.nWidth - 1) * oGiven.mnStep;
+                std::vector<double> vdfColumns(bTwo ? 2 * nColumns : nColumns);
+                const std::span<double> vdfOut(oRows.Results()[0], nSamples);
+                if (bMasked)
+                {
+                    // In two parts, as runs of a row are.
+                    const std::size_t nPart = nSamples / 3;
+                    SmoothMasked(oGiven, oKernels, 0, vdfOut.first(nPart));
+                    SmoothMasked(oGiven, oKernels, nPart, vdfOut.subspan(nPart));
+                }
+                else
+                {
+                    SmoothRow(oGiven, oKernels, vdfColumns, vdfOut);
+                }
+                oRows.ExpectResults(
+                    [&](std::size_t i, std::size_t)
+                    {
+                        const double dfFirst = Smoothed(oRows, i, oKernels.moFirst);
+                        return bTwo ? std::fabs(dfFirst - Smoothed(oRows, i, oKernels.moSecond))
+                                    : dfFirst;
+                    });
+            }
+        }
     }
 }
 
