@@ -1,6 +1,7 @@
 #include "processes/qrdfilters/slidingwindow.h"
 
 #include <algorithm>
+#include <array>
 #include <optional>
 #include <type_traits>
 #include <vector>
@@ -40,18 +41,17 @@ public:
           moCounts(moStretches, oWindow, GetValidRows()),
           mvdfCentres(moStretches.mnLongest)
     {
+        mvoSums.reserve(oTerms.size());
         for (const WindowTerm& oTerm : oTerms)
         {
-            // Terms of the same samples share the rows.
-            const auto itRows = std::find_if(
-                mvoRows.begin(), mvoRows.end(),
-                [&](const auto& oRows) { return oRows.GetTransform() == oTerm.mpfnTransform; });
-            mvnRowsOfTerm.push_back(static_cast<std::size_t>(itRows - mvoRows.begin()));
-            if (itRows == mvoRows.end())
+            Source& oSource = SourceOf(oTerm.mpfnTransform);
+            std::size_t& nSums = oTerm.mbSquared ? oSource.mnSquares : oSource.mnSums;
+            if (nSums == kNone)
             {
-                mvoRows.emplace_back(oIn, GetValidRows(), oWindow, oTerm.mpfnTransform);
+                nSums = mvoSums.size();
+                mvoSums.emplace_back(moStretches);
             }
-            mvoSums.emplace_back(moStretches, oTerm.mbSquared);
+            mvnSumsOfTerm.push_back(nSums);
         }
     }
 
@@ -65,6 +65,30 @@ public:
     }
 
 private:
+    static constexpr std::size_t kNone = kMostWindowTerms;
+
+    /// Rows, and which sums they feed.
+    struct Source
+    {
+        SummedRows<TSample> moRows;
+        std::size_t mnSums = kNone;
+        std::size_t mnSquares = kNone;
+    };
+
+    /// Terms of the same samples share the rows.
+    Source& SourceOf(WindowTerm::Transform pfnTransform)
+    {
+        const auto itSource = std::find_if(mvoSources.begin(), mvoSources.end(),
+                                           [pfnTransform](const Source& oSource) {
+                                               return oSource.moRows.GetTransform() == pfnTransform;
+                                           });
+        if (itSource != mvoSources.end())
+        {
+            return *itSource;
+        }
+        return mvoSources.emplace_back(Source{{moIn, moWindow, pfnTransform}});
+    }
+
     std::optional<ValidRows> MakeValidRows(const tessel::Mask* poMaskIn) const
     {
         if (poMaskIn == nullptr)
@@ -80,14 +104,16 @@ private:
     void ScanFirstRow()
     {
         const std::int64_t nHalfY = moWindow.mnHalfY;
-        for (std::size_t t = 0; t < mvoSums.size(); ++t)
+        for (Source& oSource : mvoSources)
         {
             for (std::int64_t y = -nHalfY; y <= nHalfY; ++y)
             {
-                mvoSums[t].AddRow(mvoRows[mvnRowsOfTerm[t]].Row(y));
+                kernels::AddRow(oSource.moRows.Row(y), moValid ? moValid->Bits(y) : nullptr,
+                                ColumnsOf(oSource.mnSums), ColumnsOf(oSource.mnSquares),
+                                moStretches.GetColumns());
             }
         }
-        moCounts.AddFirstRows();
+        moCounts.SumFirstRow();
         ForEachStretch(
             [this](std::size_t nFirst, std::size_t nSamples)
             {
@@ -99,29 +125,53 @@ private:
             });
     }
 
+    double* ColumnsOf(std::size_t nSums)
+    {
+        return nSums == kNone ? nullptr : mvoSums[nSums].GetColumns();
+    }
+
     void ScanBatch(std::uint32_t nFirstRow, std::size_t nRows)
     {
         std::vector<kernels::BatchRows> voRows;
-        for (SummedRows<TSample>& oRows : mvoRows)
+        for (Source& oSource : mvoSources)
         {
-            voRows.push_back(RowsOfBatch(oRows, nFirstRow, nRows));
-        }
-        for (std::size_t r = 0; r < nRows; ++r)
-        {
-            moCounts.SlideTo(static_cast<std::int64_t>(nFirstRow + r));
+            voRows.push_back(RowsOfBatch(oSource.moRows, nFirstRow, nRows));
         }
         ForEachStretch(
             [&](std::size_t nFirst, std::size_t nSamples)
             {
-                for (std::size_t t = 0; t < mvoSums.size(); ++t)
-                {
-                    mvoSums[t].SumBatch(voRows[mvnRowsOfTerm[t]], nFirst, nSamples);
-                }
+                SumBatch(voRows, nFirst, nSamples);
                 for (std::size_t r = 0; r < nRows; ++r)
                 {
                     Visit(static_cast<std::uint32_t>(nFirstRow + r), r, nFirst, nSamples);
                 }
             });
+    }
+
+    /// The windows of a batch of rows.
+    void SumBatch(const std::vector<kernels::BatchRows>& voRows, std::size_t nFirst,
+                  std::size_t nSamples)
+    {
+        const engine::ColumnStretch oColumns(moStretches, nFirst, nSamples);
+        const auto oOpen = [&](std::size_t nSums)
+        { return nSums == kNone ? kernels::ColumnSums() : mvoSums[nSums].OpenColumns(oColumns); };
+        for (std::size_t i = 0; i < voRows.size(); ++i)
+        {
+            kernels::SlideColumns(voRows[i], oColumns.mnFirst, oColumns.mnCount,
+                                  oOpen(mvoSources[i].mnSums), oOpen(mvoSources[i].mnSquares));
+        }
+        const std::size_t nFrom = nFirst == 0 ? moStretches.mnChannels : 0;
+        std::array<kernels::WindowTrack, kMostWindowTerms> aoTracks{};
+        for (std::size_t t = 0; t < mvoSums.size(); ++t)
+        {
+            if (nFirst == 0)
+            {
+                mvoSums[t].StartRows();
+            }
+            aoTracks[t] = mvoSums[t].OpenTrack(nFrom);
+        }
+        kernels::SlideWindows({aoTracks.data(), mvoSums.size()}, moStretches.mnSpan,
+                              nSamples - nFrom, moStretches.mnChannels);
     }
 
     /// The last batch of a block may be short: it repeats its last row, whose sums go unused, so
@@ -133,8 +183,15 @@ private:
         for (std::size_t r = 0; r < kBatchRows; ++r)
         {
             const auto y = static_cast<std::int64_t>(nFirstRow + std::min(r, nRows - 1));
-            oBatch.mapEntering[r] = oRows.Row(y + moWindow.mnHalfY);
-            oBatch.mapLeaving[r] = oRows.Row(y - moWindow.mnHalfY - 1);
+            const std::int64_t nEntering = y + moWindow.mnHalfY;
+            const std::int64_t nLeaving = y - moWindow.mnHalfY - 1;
+            oBatch.mapEntering[r] = oRows.Row(nEntering);
+            oBatch.mapLeaving[r] = oRows.Row(nLeaving);
+            if (moValid)
+            {
+                oBatch.mapEnteringValid[r] = moValid->Bits(nEntering);
+                oBatch.mapLeavingValid[r] = moValid->Bits(nLeaving);
+            }
         }
         return oBatch;
     }
@@ -155,9 +212,9 @@ private:
         oStatistics.mnRow = nRow;
         oStatistics.mnFirst = nFirst;
         oStatistics.mnSamples = nSamples;
-        for (std::size_t t = 0; t < mvoSums.size(); ++t)
+        for (std::size_t t = 0; t < mvnSumsOfTerm.size(); ++t)
         {
-            oStatistics.mapSums[t] = mvoSums[t].Row(r);
+            oStatistics.mapSums[t] = mvoSums[mvnSumsOfTerm[t]].Row(r);
         }
         oStatistics.mpCounts = moCounts.Row(nRow, nFirst, nSamples);
         oStatistics.mpCentres = Centres(nRow, nFirst, nSamples);
@@ -185,9 +242,9 @@ private:
     engine::Stretches moStretches;
     std::optional<ValidRows> moValid;
     engine::WindowCounts moCounts;
-    std::vector<SummedRows<TSample>> mvoRows;
-    std::vector<std::size_t> mvnRowsOfTerm;
+    std::vector<Source> mvoSources;
     std::vector<TermSums> mvoSums;
+    std::vector<std::size_t> mvnSumsOfTerm;
     std::vector<double> mvdfCentres;
 };
 

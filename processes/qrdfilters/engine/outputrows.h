@@ -46,7 +46,7 @@ public:
         }
         mvdfResults.resize(std::max(mvdfResults.size(), nPadded));
         moFinish(oStatistics, {mvdfResults.data(), nPadded});
-        const std::span<const double> vdfResults(mvdfResults.data(), oStatistics.mnSamples);
+        const std::span<double> vdfResults(mvdfResults.data(), oStatistics.mnSamples);
         mbMasked ? WriteMasked(oStatistics, vdfResults, pOut) : WriteAll(vdfResults, pOut);
     }
 
@@ -74,7 +74,7 @@ private:
         StoreSamples(vdfResults, pOut);
     }
 
-    void WriteMasked(const WindowStatistics& oStatistics, std::span<const double> vdfResults,
+    void WriteMasked(const WindowStatistics& oStatistics, std::span<double> vdfResults,
                      TSample* pOut)
     {
         const std::size_t nChannels = moIn.mnChannels;
@@ -87,9 +87,14 @@ private:
         if constexpr (std::is_same_v<TSample, double>)
         {
             const unsigned char* pComputed = ComputedSamples(nChannels);
-            const std::span<double> vdfOut(pOut, vdfResults.size());
+            const std::span<double> vdfOut =
+                mbStreamed ? vdfResults : std::span<double>(pOut, vdfResults.size());
             mbBGZero ? kernels::ClearMasked(pComputed, vdfResults.data(), vdfOut)
                      : kernels::SelectValid(pComputed, vdfResults.data(), pIn, vdfOut);
+            if (mbStreamed)
+            {
+                kernels::StreamRow(vdfOut, pOut);
+            }
         }
         else
         {

@@ -20,7 +20,7 @@ public:
         : mnNext(-std::int64_t{oWindow.mnHalfY}),
           mnFirst(mnNext),
           mnRows(oWindow.GetHeight() + kernels::kBatchRows),
-          mnLength(kernels::PadRow(nLength) + kernels::kRowPadding),
+          mnLength(kernels::PadRow(nLength) + kernels::kCountPadding),
           mvValues(mnRows * mnLength)
     {
     }
@@ -35,12 +35,13 @@ public:
         return Slot(y);
     }
 
-private:
+    /// The place of a row, for what makes it.
     T* Slot(std::int64_t y)
     {
         return &mvValues[static_cast<std::size_t>(y - mnFirst) % mnRows * mnLength];
     }
 
+private:
     std::int64_t mnNext;
     std::int64_t mnFirst;
     std::size_t mnRows;

@@ -2,7 +2,9 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <span>
 #include <type_traits>
+#include <vector>
 
 #include "basic/tessel/mask/mask.h"
 #include "basic/tessel/raster/raster.h"
@@ -14,61 +16,72 @@
 namespace kor::filters::engine
 {
 
-/// The validity of the pixels in a row of windows, as bytes: one a pixel, and one a sample.
+/// The validity of the samples in a row of windows, as bits, and how many samples of each channel
+/// are valid in the row of each window.
 class ValidRows
 {
 public:
     ValidRows(const tessel::Mask& oMask, const Window& oWindow, std::size_t nPixels,
               std::size_t nChannels)
         : moMask(oMask),
-          mnLeft(-std::int64_t{oWindow.mnHalfX}),
-          mnPixels(nPixels),
+          moWindow(oWindow),
           mnChannels(nChannels),
-          moPixels(oWindow, nPixels),
-          moSamples(oWindow, nChannels == 1 ? 0 : nPixels * nChannels)
+          mnWindows((nPixels - oWindow.GetWidth() + 1) * nChannels),
+          mvPixels(nPixels + kernels::kCountPadding),
+          mvSamples(nPixels * nChannels + kernels::kCountPadding),
+          mvnScratch(mvSamples.size()),
+          moBits(oWindow, kernels::PadRow(nPixels * nChannels) / 8),
+          moCounts(oWindow, mnWindows)
     {
     }
 
-    const unsigned char* Pixels(std::int64_t y)
+    const unsigned char* Bits(std::int64_t y)
     {
-        return moPixels.Get(y,
-                            [this](std::int64_t nRow, unsigned char* pRow) {
-                                moMask.ExpandRow(mnLeft, nRow, {pRow, mnPixels});
-                            });
+        return moBits.Get(y, [this](std::int64_t nRow, unsigned char* pBits)
+                          { MakeRow(nRow, pBits, moCounts.Slot(nRow)); });
     }
 
-    const unsigned char* Samples(std::int64_t y)
+    const std::int32_t* Counts(std::int64_t y)
     {
-        if (mnChannels == 1)
-        {
-            return Pixels(y);
-        }
-        return moSamples.Get(
-            y,
-            [this](std::int64_t nRow, unsigned char* pRow) {
-                RepeatForChannels<unsigned char>({Pixels(nRow), mnPixels}, mnChannels, pRow);
-            });
+        Bits(y);
+        return moCounts.Slot(y);
     }
 
 private:
+    void MakeRow(std::int64_t y, unsigned char* pBits, std::int32_t* pnCounts)
+    {
+        const std::span<unsigned char> oPixels(mvPixels.data(),
+                                               mvPixels.size() - kernels::kCountPadding);
+        moMask.ExpandRow(-std::int64_t{moWindow.mnHalfX}, y, oPixels);
+        const unsigned char* pSamples = mvPixels.data();
+        if (mnChannels != 1)
+        {
+            RepeatForChannels<unsigned char>(oPixels, mnChannels, mvSamples.data());
+            pSamples = mvSamples.data();
+        }
+        kernels::PackValid(pSamples, oPixels.size() * mnChannels, pBits);
+        kernels::CountValid(pSamples, moWindow.GetWidth(), mnChannels, mvnScratch.data(),
+                            {pnCounts, mnWindows});
+    }
+
     const tessel::Mask& moMask;
-    std::int64_t mnLeft;
-    std::size_t mnPixels;
+    Window moWindow;
     std::size_t mnChannels;
-    RowRing<unsigned char> moPixels;
-    RowRing<unsigned char> moSamples;
+    std::size_t mnWindows;  ///< in a row, times the channels
+    std::vector<unsigned char> mvPixels;
+    std::vector<unsigned char> mvSamples;
+    std::vector<std::int32_t> mvnScratch;
+    RowRing<unsigned char> moBits;
+    RowRing<std::int32_t> moCounts;
 };
 
-/// The rows that enter the sums: doubles, transformed, and +0.0 in the place of masked samples,
-/// since the sums start at +0.0 and adding or subtracting +0.0 changes nothing.
+/// The rows that enter the sums: doubles, transformed. Masked samples are among them.
 template <class TSample>
 class SummedRows
 {
 public:
-    SummedRows(const tessel::Raster& oIn, ValidRows* poValid, const Window& oWindow,
-               WindowTerm::Transform pfnTransform)
+    SummedRows(const tessel::Raster& oIn, const Window& oWindow, WindowTerm::Transform pfnTransform)
         : moIn(oIn),
-          mpoValid(poValid),
           mnLeft(-std::int64_t{oWindow.mnHalfX}),
           mnSamples((oIn.mnWidth + oWindow.GetWidth() - 1) * oIn.mnChannels),
           mpfnTransform(pfnTransform),
@@ -92,35 +105,18 @@ public:
     }
 
 private:
-    bool IsAsItLies() const
-    {
-        return std::is_same_v<TSample, double> && mpoValid == nullptr && mpfnTransform == nullptr;
-    }
+    bool IsAsItLies() const { return std::is_same_v<TSample, double> && mpfnTransform == nullptr; }
 
     void MakeRow(std::int64_t y, std::span<double> vdfRow)
     {
-        const auto* pIn = moIn.GetPixelAs<const TSample>(mnLeft, y);
-        if constexpr (std::is_same_v<TSample, double>)
-        {
-            if (mpfnTransform == nullptr)
-            {
-                kernels::ClearMasked(mpoValid->Samples(y), pIn, vdfRow);
-                return;
-            }
-        }
-        LoadSamples(pIn, vdfRow);
+        LoadSamples(moIn.GetPixelAs<const TSample>(mnLeft, y), vdfRow);
         if (mpfnTransform != nullptr)
         {
             mpfnTransform(vdfRow);
         }
-        if (mpoValid != nullptr)
-        {
-            kernels::ClearMasked(mpoValid->Samples(y), vdfRow.data(), vdfRow);
-        }
     }
 
     const tessel::Raster& moIn;
-    ValidRows* mpoValid;
     std::int64_t mnLeft;
     std::size_t mnSamples;
     WindowTerm::Transform mpfnTransform;

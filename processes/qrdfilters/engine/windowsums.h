@@ -39,24 +39,46 @@ struct Stretches
     std::size_t mnLongest;  ///< samples of a stretch, a multiple of the channels and the padding
 };
 
+/// The columns that a stretch moves down: whole bytes of validity, and so some columns more than
+/// its windows have.
+class ColumnStretch
+{
+public:
+    ColumnStretch(const Stretches& oStretches, std::size_t nFirst, std::size_t nSamples)
+        : mnFirst(nFirst == 0 ? 0 : EndOf(oStretches, nFirst)),
+          mnCount(EndOf(oStretches, nFirst + nSamples) - mnFirst),
+          mnPlace(mnFirst + oStretches.mnChannels - nFirst)
+    {
+    }
+
+    std::size_t mnFirst;
+    std::size_t mnCount;
+    std::size_t
+        mnPlace;  ///< of column mnFirst, where place i is the column that leaves at sample i
+
+private:
+    static std::size_t EndOf(const Stretches& oStretches, std::size_t nSamples)
+    {
+        return std::min(oStretches.GetColumns(),
+                        PadRow(nSamples - oStretches.mnChannels + oStretches.mnSpan));
+    }
+};
+
 /// The sums of one term. All stretches of a batch are taken in order from the left.
 class TermSums
 {
 public:
-    TermSums(const Stretches& oStretches, bool bSquared)
+    explicit TermSums(const Stretches& oStretches)
         : moStretches(oStretches),
-          mbSquared(bSquared),
           mvdfColumns(oStretches.GetColumns() + kernels::kRowPadding),
-          mvoColumns(oStretches.mnLongest + oStretches.mnSpan + kernels::kRowPadding),
+          mvoColumns(oStretches.mnLongest + oStretches.mnSpan + 2 * kernels::kRowPadding),
           mvoRunning(oStretches.mnChannels),
           mvdfRows(kBatchRows * oStretches.mnLongest)
     {
     }
 
-    void AddRow(const double* pRow)
-    {
-        kernels::AddRow(pRow, mbSquared, {mvdfColumns.data(), moStretches.GetColumns()});
-    }
+    /// The sums of the columns.
+    double* GetColumns() { return mvdfColumns.data(); }
 
     /// The windows of the first row, each from scratch.
     void SumFirstRow(std::size_t nFirst, std::size_t nSamples)
@@ -66,40 +88,31 @@ public:
                             {mvdfRows.data(), PadRow(nSamples)});
     }
 
-    /// The windows of a batch of rows.
-    void SumBatch(const kernels::BatchRows& oRows, std::size_t nFirst, std::size_t nSamples)
+    /// Where the columns of the next stretch go.
+    kernels::ColumnSums OpenColumns(const ColumnStretch& oColumns)
     {
-        // The column that leaves the window of sample i is mvoColumns[i], the one that enters it
-        // mvoColumns[i + nSpan].
-        const std::size_t nSpan = moStretches.mnSpan;
-        if (nFirst == 0)
+        if (oColumns.mnFirst != 0)
         {
-            const std::size_t nChannels = moStretches.mnChannels;
-            SlideColumns(oRows, 0, nSamples - nChannels + nSpan, nChannels);
-            StartRows();
-            SlideWindows(nChannels, nSamples - nChannels);
+            // What this stretch has in common with the one before.
+            const auto itKept =
+                mvoColumns.begin() + static_cast<std::ptrdiff_t>(moStretches.mnLongest);
+            std::copy_n(itKept, oColumns.mnPlace, mvoColumns.begin());
         }
-        else
-        {
-            std::copy_n(mvoColumns.begin() + static_cast<std::ptrdiff_t>(moStretches.mnLongest),
-                        nSpan, mvoColumns.begin());
-            SlideColumns(oRows, nFirst - moStretches.mnChannels + nSpan, nSamples, nSpan);
-            SlideWindows(0, nSamples);
-        }
+        return {&mvdfColumns[oColumns.mnFirst], &mvoColumns[oColumns.mnPlace]};
     }
 
-    /// The window sums of row r of the batch.
-    const double* Row(std::size_t r) const { return &mvdfRows[r * moStretches.mnLongest]; }
-
-private:
-    void SlideColumns(const kernels::BatchRows& oRows, std::size_t nFirst, std::size_t nCount,
-                      std::size_t nPlace)
+    /// The way along the row from sample nFrom of the stretch on.
+    kernels::WindowTrack OpenTrack(std::size_t nFrom)
     {
-        kernels::SlideColumns(oRows, nFirst, mbSquared, {&mvdfColumns[nFirst], nCount},
-                              &mvoColumns[nPlace]);
+        kernels::WindowTrack oTrack{&mvoColumns[nFrom], mvoRunning.data(), {}};
+        for (std::size_t r = 0; r < kBatchRows; ++r)
+        {
+            oTrack.mapRows[r] = &mvdfRows[r * moStretches.mnLongest + nFrom];
+        }
+        return oTrack;
     }
 
-    /// The first pixel of each row, from scratch.
+    /// The first pixel of each row of a batch, from scratch.
     void StartRows()
     {
         const std::size_t nChannels = moStretches.mnChannels;
@@ -114,20 +127,14 @@ private:
         }
     }
 
-    void SlideWindows(std::size_t nFrom, std::size_t nCount)
-    {
-        std::array<double*, kBatchRows> apRows{};
-        for (std::size_t r = 0; r < kBatchRows; ++r)
-        {
-            apRows[r] = &mvdfRows[r * moStretches.mnLongest + nFrom];
-        }
-        kernels::SlideWindows(&mvoColumns[nFrom], moStretches.mnSpan, nCount,
-                              moStretches.mnChannels, mvoRunning.data(), apRows);
-    }
+    /// The window sums of row r of the batch.
+    const double* Row(std::size_t r) const { return &mvdfRows[r * moStretches.mnLongest]; }
 
+private:
     const Stretches& moStretches;
-    bool mbSquared;
     std::vector<double> mvdfColumns;
+    /// The column that leaves the window of sample i is mvoColumns[i], the one that enters it
+    /// mvoColumns[i + mnSpan].
     std::vector<BatchColumn> mvoColumns;
     std::vector<BatchColumn> mvoRunning;
     std::vector<double> mvdfRows;
@@ -138,81 +145,55 @@ class WindowCounts
 {
 public:
     WindowCounts(const Stretches& oStretches, const Window& oWindow, ValidRows* poValid)
-        : moStretches(oStretches),
-          moWindow(oWindow),
+        : moWindow(oWindow),
           mpoValid(poValid),
-          mnColumns(oStretches.GetColumns() / oStretches.mnChannels),
-          mnRow(PadRow(mnColumns) + kernels::kRowPadding),
+          mnSamples(oStretches.mnSamples),
           mvdfCounts(oStretches.mnLongest,
                      static_cast<double>(oWindow.GetWidth() * oWindow.GetHeight()))
     {
         if (mpoValid != nullptr)
         {
-            mvnColumns.resize(kBatchRows * mnRow);
-            mvdfPixels.resize(oStretches.mnLongest / oStretches.mnChannels);
+            mvnCounts.resize(PadRow(mnSamples));
         }
     }
 
-    /// Moves the columns to row 0 of the block.
-    void AddFirstRows()
+    /// Sums the windows of row 0 of the block.
+    void SumFirstRow()
     {
-        if (mpoValid == nullptr)
-        {
-            return;
-        }
-        const std::vector<unsigned char> vNone(mnColumns);
         const std::int64_t nHalfY = moWindow.mnHalfY;
-        for (std::int64_t y = -nHalfY; y <= nHalfY; ++y)
+        for (std::int64_t y = -nHalfY; mpoValid != nullptr && y <= nHalfY; ++y)
         {
-            kernels::SlideCounts(Columns(0), vNone.data(), mpoValid->Pixels(y),
-                                 {Columns(0), mnColumns});
+            kernels::AddCounts(mpoValid->Counts(y), {mvnCounts.data(), mnSamples});
         }
     }
 
-    /// Moves the columns from row nRow - 1 to row nRow of the block.
-    void SlideTo(std::int64_t nRow)
-    {
-        if (mpoValid == nullptr)
-        {
-            return;
-        }
-        kernels::SlideCounts(Columns(nRow - 1), mpoValid->Pixels(nRow - moWindow.mnHalfY - 1),
-                             mpoValid->Pixels(nRow + moWindow.mnHalfY), {Columns(nRow), mnColumns});
-    }
-
-    /// The counts of a stretch of row nRow, which is among the last kBatchRows rows; they hold
-    /// until the next call.
+    /// The counts of a stretch of row nRow; each stretch is asked for once in each row, from row 0
+    /// on. They hold until the next call.
     const double* Row(std::int64_t nRow, std::size_t nFirst, std::size_t nSamples)
     {
         if (mpoValid == nullptr)
         {
             return mvdfCounts.data();
         }
-        const std::size_t nChannels = moStretches.mnChannels;
-        const std::size_t nPixels = nSamples / nChannels;
-        kernels::SumCounts(Columns(nRow) + nFirst / nChannels, moWindow.GetWidth(),
-                           {mvdfPixels.data(), nPixels});
-        if (nChannels == 1)
+        const std::span<double> vdfCounts(mvdfCounts.data(), PadRow(nSamples));
+        if (nRow == 0)
         {
-            return mvdfPixels.data();
+            kernels::LoadCounts(&mvnCounts[nFirst], vdfCounts);
         }
-        RepeatForChannels<double>({mvdfPixels.data(), nPixels}, nChannels, mvdfCounts.data());
+        else
+        {
+            kernels::SlideCounts(mpoValid->Counts(nRow - moWindow.mnHalfY - 1) + nFirst,
+                                 mpoValid->Counts(nRow + moWindow.mnHalfY) + nFirst,
+                                 &mvnCounts[nFirst], vdfCounts);
+        }
         return mvdfCounts.data();
     }
 
 private:
-    std::int32_t* Columns(std::int64_t nRow)
-    {
-        return &mvnColumns[static_cast<std::size_t>(nRow) % kBatchRows * mnRow];
-    }
-
-    const Stretches& moStretches;
     Window moWindow;
     ValidRows* mpoValid;
-    std::size_t mnColumns;
-    std::size_t mnRow;
-    std::vector<std::int32_t> mvnColumns;
-    std::vector<double> mvdfPixels;
+    std::size_t mnSamples;
+    std::vector<std::int32_t> mvnCounts;
     std::vector<double> mvdfCounts;
 };
 

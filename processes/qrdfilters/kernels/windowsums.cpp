@@ -25,13 +25,6 @@ constexpr Doubles kTag;
 constexpr std::size_t kLanes = hn::MaxLanes(kTag);
 constexpr std::size_t kGroups = kBatchRows / kLanes;
 
-template <bool kSquared>
-HWY_INLINE Vector Term(const double* pSample)
-{
-    const Vector oSample = hn::LoadU(kTag, pSample);
-    return kSquared ? hn::Mul(oSample, oSample) : oSample;
-}
-
 #if HWY_TARGET == HWY_SCALAR
 HWY_INLINE void Transpose(Vector* /*poRows*/) {}
 #else
@@ -81,94 +74,261 @@ HWY_INLINE void Transpose(Vector* poRows)
 
 #endif
 
-template <bool kSquared>
-void AddRowOf(const double* pRow, std::span<double> oSums)
+ColumnSums From(const ColumnSums& oSums, std::size_t i)
 {
-    std::size_t i = 0;
-    for (; i + kLanes <= oSums.size(); i += kLanes)
-    {
-        hn::StoreU(hn::Add(hn::LoadU(kTag, &oSums[i]), Term<kSquared>(pRow + i)), kTag, &oSums[i]);
-    }
-    for (; i < oSums.size(); ++i)
-    {
-        oSums[i] += kSquared ? pRow[i] * pRow[i] : pRow[i];
-    }
+    return oSums.mpSums == nullptr ? oSums : ColumnSums{oSums.mpSums + i, oSums.mpoBatch + i};
 }
 
-void AddRow(const double* pRow, bool bSquared, std::span<double> oSums)
+/// Bits of kLanes samples from sample i on, which is a multiple of kLanes, in the lowest place.
+HWY_INLINE unsigned char LaneBits(const unsigned char* pValid, std::size_t i)
 {
-    bSquared ? AddRowOf<true>(pRow, oSums) : AddRowOf<false>(pRow, oSums);
+    return static_cast<unsigned char>(pValid[i / 8] >> (i % 8));
 }
 
-/// kLanes columns from column i of the rows on.
-template <bool kSquared>
-HWY_INLINE void SlideColumnGroup(const BatchRows& oRows, std::size_t i, double* pSums,
-                                 BatchColumn* poBatch)
+/// kLanes samples from sample i on, but +0.0 where they are masked.
+template <bool kMasked>
+HWY_INLINE Vector Samples(const double* pRow, const unsigned char* pValid, std::size_t i)
+{
+    const Vector oSamples = hn::LoadU(kTag, pRow + i);
+    if constexpr (kMasked)
+    {
+        const unsigned char nBits = LaneBits(pValid, i);
+        return hn::IfThenElseZero(hn::LoadMaskBits(kTag, &nBits), oSamples);
+    }
+    return oSamples;
+}
+
+/// The sums of kLanes columns on their way through the rows of a batch.
+class ColumnGroup
+{
+public:
+    HWY_INLINE ColumnGroup(const ColumnSums& oSums, std::size_t i)
+        : mpSums(oSums.mpSums + i), mpoBatch(oSums.mpoBatch + i), moSum(hn::LoadU(kTag, mpSums))
+    {
+    }
+
+    HWY_INLINE void Move(std::size_t k, Vector oLeaving, Vector oEntering)
+    {
+        moSum = hn::Add(hn::Sub(moSum, oLeaving), oEntering);
+        maoAfter[k] = moSum;
+    }
+
+    HWY_INLINE void StoreRows(std::size_t nGroup)
+    {
+        Transpose(maoAfter);
+        for (std::size_t k = 0; k < kLanes; ++k)
+        {
+            hn::StoreU(maoAfter[k], kTag, &mpoBatch[k].madfRows[nGroup * kLanes]);
+        }
+    }
+
+    HWY_INLINE void StoreSums() const { hn::StoreU(moSum, kTag, mpSums); }
+
+private:
+    double* mpSums;
+    BatchColumn* mpoBatch;
+    Vector moSum;
+    Vector maoAfter[kLanes];
+};
+
+enum class Wanted
+{
+    Sums,
+    Squares,
+    Both
+};
+
+/// kLanes columns from column nFirst + i of the rows on.
+template <bool kMasked, Wanted kWanted>
+HWY_INLINE void SlideColumnGroup(const BatchRows& oRows, std::size_t nFirst, std::size_t i,
+                                 const ColumnSums& oSums, const ColumnSums& oSquares)
 {
     // Far enough ahead for the latency of memory: eight cache lines.
     constexpr std::size_t kAhead = 64;
-    Vector oSum = hn::LoadU(kTag, pSums);
+    const std::size_t nColumn = nFirst + i;
+    ColumnGroup oSum(kWanted == Wanted::Squares ? oSquares : oSums, i);
+    ColumnGroup oSquare(kWanted == Wanted::Sums ? oSums : oSquares, i);
     for (std::size_t nGroup = 0; nGroup < kGroups; ++nGroup)
     {
-        Vector aoAfter[kLanes];
         for (std::size_t k = 0; k < kLanes; ++k)
         {
             const std::size_t r = nGroup * kLanes + k;
-            hwy::Prefetch(oRows.mapEntering[r] + i + kAhead);
-            oSum = hn::Sub(oSum, Term<kSquared>(oRows.mapLeaving[r] + i));
-            oSum = hn::Add(oSum, Term<kSquared>(oRows.mapEntering[r] + i));
-            aoAfter[k] = oSum;
+            hwy::Prefetch(oRows.mapEntering[r] + nColumn + kAhead);
+            const Vector oLeaving =
+                Samples<kMasked>(oRows.mapLeaving[r], oRows.mapLeavingValid[r], nColumn);
+            const Vector oEntering =
+                Samples<kMasked>(oRows.mapEntering[r], oRows.mapEnteringValid[r], nColumn);
+            if constexpr (kWanted != Wanted::Squares)
+            {
+                oSum.Move(k, oLeaving, oEntering);
+            }
+            if constexpr (kWanted != Wanted::Sums)
+            {
+                oSquare.Move(k, hn::Mul(oLeaving, oLeaving), hn::Mul(oEntering, oEntering));
+            }
         }
-        Transpose(aoAfter);
-        for (std::size_t k = 0; k < kLanes; ++k)
+        if constexpr (kWanted != Wanted::Squares)
         {
-            hn::StoreU(aoAfter[k], kTag, &poBatch[k].madfRows[nGroup * kLanes]);
+            oSum.StoreRows(nGroup);
+        }
+        if constexpr (kWanted != Wanted::Sums)
+        {
+            oSquare.StoreRows(nGroup);
         }
     }
-    hn::StoreU(oSum, kTag, pSums);
-}
-
-/// The columns behind the last whole group, through buffers that can be read to the end.
-template <bool kSquared>
-void SlideLastColumns(const BatchRows& oRows, std::size_t nFirst, std::span<double> oSums,
-                      BatchColumn* poBatch)
-{
-    const std::size_t nBytes = oSums.size() * sizeof(double);
-    double adfRows[2 * kBatchRows][kLanes] = {};
-    double adfSums[kLanes] = {};
-    BatchRows oCopies;
-    std::memcpy(adfSums, oSums.data(), nBytes);
-    for (std::size_t r = 0; r < kBatchRows; ++r)
+    if constexpr (kWanted != Wanted::Squares)
     {
-        std::memcpy(adfRows[r], oRows.mapLeaving[r] + nFirst, nBytes);
-        std::memcpy(adfRows[kBatchRows + r], oRows.mapEntering[r] + nFirst, nBytes);
-        oCopies.mapLeaving[r] = adfRows[r];
-        oCopies.mapEntering[r] = adfRows[kBatchRows + r];
+        oSum.StoreSums();
     }
-    SlideColumnGroup<kSquared>(oCopies, 0, adfSums, poBatch);
-    std::memcpy(oSums.data(), adfSums, nBytes);
+    if constexpr (kWanted != Wanted::Sums)
+    {
+        oSquare.StoreSums();
+    }
 }
 
-template <bool kSquared>
-void SlideColumnsOf(const BatchRows& oRows, std::size_t nFirst, std::span<double> oSums,
-                    BatchColumn* poBatch)
+/// Copies of the rows of a batch and of sums behind its last whole vector, which can be read and
+/// written to the end.
+class LastColumns
+{
+public:
+    LastColumns(const BatchRows& oRows, bool bMasked, std::size_t nFirst, std::size_t nCount)
+        : mnCount(nCount)
+    {
+        for (std::size_t r = 0; r < kBatchRows; ++r)
+        {
+            moRows.mapLeaving[r] = Copy(oRows.mapLeaving[r] + nFirst, madfRows[r]);
+            moRows.mapEntering[r] = Copy(oRows.mapEntering[r] + nFirst, madfRows[kBatchRows + r]);
+            if (bMasked)
+            {
+                manValid[r] = LaneBits(oRows.mapLeavingValid[r], nFirst);
+                manValid[kBatchRows + r] = LaneBits(oRows.mapEnteringValid[r], nFirst);
+            }
+            moRows.mapLeavingValid[r] = &manValid[r];
+            moRows.mapEnteringValid[r] = &manValid[kBatchRows + r];
+        }
+    }
+    LastColumns(const LastColumns&) = delete;
+    LastColumns& operator=(const LastColumns&) = delete;
+
+    const BatchRows& Rows() const { return moRows; }
+
+    /// pCopy holds kLanes sums.
+    ColumnSums Open(const ColumnSums& oSums, double* pCopy) const
+    {
+        if (oSums.mpSums != nullptr)
+        {
+            Copy(oSums.mpSums, pCopy);
+        }
+        return {pCopy, oSums.mpoBatch};
+    }
+
+    void Close(const double* pCopy, const ColumnSums& oSums) const
+    {
+        if (oSums.mpSums != nullptr)
+        {
+            std::copy_n(pCopy, mnCount, oSums.mpSums);
+        }
+    }
+
+private:
+    const double* Copy(const double* pFrom, double* pTo) const
+    {
+        std::copy_n(pFrom, mnCount, pTo);
+        return pTo;
+    }
+
+    std::size_t mnCount;
+    BatchRows moRows{};
+    double madfRows[2 * kBatchRows][kLanes] = {};
+    unsigned char manValid[2 * kBatchRows] = {};
+};
+
+template <bool kMasked, Wanted kWanted>
+void SlideColumnsOf(const BatchRows& oRows, std::size_t nFirst, std::size_t nCount,
+                    const ColumnSums& oSums, const ColumnSums& oSquares)
 {
     std::size_t i = 0;
-    for (; i + kLanes <= oSums.size(); i += kLanes)
+    for (; i + kLanes <= nCount; i += kLanes)
     {
-        SlideColumnGroup<kSquared>(oRows, nFirst + i, &oSums[i], poBatch + i);
+        SlideColumnGroup<kMasked, kWanted>(oRows, nFirst, i, oSums, oSquares);
     }
-    if (i < oSums.size())
+    if (i < nCount)
     {
-        SlideLastColumns<kSquared>(oRows, nFirst + i, oSums.subspan(i), poBatch + i);
+        const LastColumns oLast(oRows, kMasked, nFirst + i, nCount - i);
+        const ColumnSums oLastSums = From(oSums, i);
+        const ColumnSums oLastSquares = From(oSquares, i);
+        double adfSums[kLanes] = {};
+        double adfSquares[kLanes] = {};
+        SlideColumnGroup<kMasked, kWanted>(oLast.Rows(), 0, 0, oLast.Open(oLastSums, adfSums),
+                                           oLast.Open(oLastSquares, adfSquares));
+        oLast.Close(adfSums, oLastSums);
+        oLast.Close(adfSquares, oLastSquares);
     }
 }
 
-void SlideColumns(const BatchRows& oRows, std::size_t nFirst, bool bSquared,
-                  std::span<double> oSums, BatchColumn* poBatch)
+template <bool kMasked>
+void SlideWantedColumns(const BatchRows& oRows, std::size_t nFirst, std::size_t nCount,
+                        const ColumnSums& oSums, const ColumnSums& oSquares)
 {
-    bSquared ? SlideColumnsOf<true>(oRows, nFirst, oSums, poBatch)
-             : SlideColumnsOf<false>(oRows, nFirst, oSums, poBatch);
+    if (oSquares.mpSums == nullptr)
+    {
+        SlideColumnsOf<kMasked, Wanted::Sums>(oRows, nFirst, nCount, oSums, oSquares);
+    }
+    else if (oSums.mpSums == nullptr)
+    {
+        SlideColumnsOf<kMasked, Wanted::Squares>(oRows, nFirst, nCount, oSums, oSquares);
+    }
+    else
+    {
+        SlideColumnsOf<kMasked, Wanted::Both>(oRows, nFirst, nCount, oSums, oSquares);
+    }
+}
+
+void SlideColumns(const BatchRows& oRows, std::size_t nFirst, std::size_t nCount,
+                  const ColumnSums& oSums, const ColumnSums& oSquares)
+{
+    oRows.mapEnteringValid[0] == nullptr
+        ? SlideWantedColumns<false>(oRows, nFirst, nCount, oSums, oSquares)
+        : SlideWantedColumns<true>(oRows, nFirst, nCount, oSums, oSquares);
+}
+
+template <bool kMasked>
+void AddRowOf(const double* pRow, const unsigned char* pValid, double* pSums, double* pSquares,
+              std::size_t nCount)
+{
+    for (std::size_t i = 0; i < nCount; i += kLanes)
+    {
+        double adfLast[kLanes] = {};
+        const std::size_t nLeft = std::min(kLanes, nCount - i);
+        const double* pSamples = pRow + i;
+        if (nLeft < kLanes)
+        {
+            std::copy_n(pSamples, nLeft, adfLast);
+            pSamples = adfLast;
+        }
+        Vector oSamples = hn::LoadU(kTag, pSamples);
+        if constexpr (kMasked)
+        {
+            const unsigned char nBits = LaneBits(pValid, i);
+            oSamples = hn::IfThenElseZero(hn::LoadMaskBits(kTag, &nBits), oSamples);
+        }
+        if (pSums != nullptr)
+        {
+            hn::StoreU(hn::Add(hn::LoadU(kTag, pSums + i), oSamples), kTag, pSums + i);
+        }
+        if (pSquares != nullptr)
+        {
+            hn::StoreU(hn::Add(hn::LoadU(kTag, pSquares + i), hn::Mul(oSamples, oSamples)), kTag,
+                       pSquares + i);
+        }
+    }
+}
+
+void AddRow(const double* pRow, const unsigned char* pValid, double* pSums, double* pSquares,
+            std::size_t nCount)
+{
+    pValid == nullptr ? AddRowOf<false>(pRow, pValid, pSums, pSquares, nCount)
+                      : AddRowOf<true>(pRow, pValid, pSums, pSquares, nCount);
 }
 
 void SumWindows(const double* pColumns, std::size_t nCount, std::size_t nStep,
@@ -250,55 +410,81 @@ private:
     Vector maoSums[kGroups];
 };
 
+/// kLanes samples from sample i on.
 template <bool kOneChannel>
-void SlideWindowsOf(const BatchColumn* poColumns, std::size_t nSpan, std::size_t nSamples,
-                    std::size_t nChannels, BatchColumn* poSums,
-                    const std::array<double*, kBatchRows>& apRows)
+HWY_INLINE void SlideWindowGroup(const WindowTrack& oTrack, std::size_t nSpan, std::size_t i,
+                                 RunningSums<kOneChannel>& oSums)
 {
-    RunningSums<kOneChannel> oSums(poSums, nChannels);
-    std::size_t i = 0;
-    for (; i + kLanes <= nSamples; i += kLanes)
+    Vector aaoSquares[kGroups][kLanes];
+    const BatchColumn* poColumns = oTrack.mpoColumns + i;
+    for (std::size_t k = 0; k < kLanes; ++k)
     {
-        Vector aaoSquares[kGroups][kLanes];
-        for (std::size_t k = 0; k < kLanes; ++k)
-        {
-            oSums.Move(poColumns[i + k], poColumns[i + k + nSpan]);
-            for (std::size_t g = 0; g < kGroups; ++g)
-            {
-                aaoSquares[g][k] = oSums.Group(g);
-            }
-        }
+        oSums.Move(poColumns[k], poColumns[k + nSpan]);
         for (std::size_t g = 0; g < kGroups; ++g)
         {
-            Transpose(aaoSquares[g]);
-            for (std::size_t k = 0; k < kLanes; ++k)
-            {
-                hn::StoreU(aaoSquares[g][k], kTag, apRows[g * kLanes + k] + i);
-            }
+            aaoSquares[g][k] = oSums.Group(g);
         }
     }
-    for (; i < nSamples; ++i)
+    for (std::size_t g = 0; g < kGroups; ++g)
+    {
+        Transpose(aaoSquares[g]);
+        for (std::size_t k = 0; k < kLanes; ++k)
+        {
+            hn::StoreU(aaoSquares[g][k], kTag, oTrack.mapRows[g * kLanes + k] + i);
+        }
+    }
+}
+
+/// The samples behind the last whole vector.
+template <bool kOneChannel>
+void SlideLastWindows(const WindowTrack& oTrack, std::size_t nSpan, std::size_t nFirst,
+                      std::size_t nSamples, RunningSums<kOneChannel>& oSums)
+{
+    for (std::size_t i = nFirst; i < nSamples; ++i)
     {
         BatchColumn oLast;
-        oSums.Move(poColumns[i], poColumns[i + nSpan]);
+        oSums.Move(oTrack.mpoColumns[i], oTrack.mpoColumns[i + nSpan]);
         oSums.StoreTo(oLast);
         for (std::size_t r = 0; r < kBatchRows; ++r)
         {
-            apRows[r][i] = oLast.madfRows[r];
+            oTrack.mapRows[r][i] = oLast.madfRows[r];
         }
     }
     if (kOneChannel)
     {
-        oSums.StoreTo(*poSums);
+        oSums.StoreTo(*oTrack.mpoSums);
     }
 }
 
-void SlideWindows(const BatchColumn* poColumns, std::size_t nSpan, std::size_t nSamples,
-                  std::size_t nChannels, BatchColumn* poSums,
-                  const std::array<double*, kBatchRows>& apRows)
+template <bool kOneChannel>
+void SlideWindowsOf(std::span<const WindowTrack> oTracks, std::size_t nSpan, std::size_t nSamples,
+                    std::size_t nChannels)
 {
-    nChannels == 1 ? SlideWindowsOf<true>(poColumns, nSpan, nSamples, nChannels, poSums, apRows)
-                   : SlideWindowsOf<false>(poColumns, nSpan, nSamples, nChannels, poSums, apRows);
+    RunningSums<kOneChannel> oFirst(oTracks.front().mpoSums, nChannels);
+    RunningSums<kOneChannel> oSecond(oTracks.back().mpoSums, nChannels);
+    const bool bTwo = oTracks.size() == 2;
+    std::size_t i = 0;
+    for (; i + kLanes <= nSamples; i += kLanes)
+    {
+        // Two chains of additions that wait for themselves, but not for each other.
+        SlideWindowGroup(oTracks.front(), nSpan, i, oFirst);
+        if (bTwo)
+        {
+            SlideWindowGroup(oTracks.back(), nSpan, i, oSecond);
+        }
+    }
+    SlideLastWindows(oTracks.front(), nSpan, i, nSamples, oFirst);
+    if (bTwo)
+    {
+        SlideLastWindows(oTracks.back(), nSpan, i, nSamples, oSecond);
+    }
+}
+
+void SlideWindows(std::span<const WindowTrack> oTracks, std::size_t nSpan, std::size_t nSamples,
+                  std::size_t nChannels)
+{
+    nChannels == 1 ? SlideWindowsOf<true>(oTracks, nSpan, nSamples, nChannels)
+                   : SlideWindowsOf<false>(oTracks, nSpan, nSamples, nChannels);
 }
 
 /// Mask of the lanes whose byte is not 0.
@@ -359,37 +545,102 @@ void StreamRow(std::span<const double> oIn, double* pOut)
     std::copy(oIn.begin() + static_cast<std::ptrdiff_t>(i), oIn.end(), pOut + i);
 }
 
-void SlideCounts(const std::int32_t* pBefore, const unsigned char* pLeaving,
-                 const unsigned char* pEntering, std::span<std::int32_t> oAfter)
+void PackValid(const unsigned char* pValid, std::size_t nSamples, unsigned char* pBits)
 {
-    const hn::ScalableTag<std::int32_t> oTag;
-    const hn::Rebind<std::uint8_t, decltype(oTag)> oByteTag;
+    const hn::CappedTag<std::uint8_t, 64> oTag;
     const std::size_t nLanes = hn::Lanes(oTag);
     std::size_t i = 0;
-    for (; i + nLanes <= oAfter.size(); i += nLanes)
+    for (; nLanes >= 8 && i + nLanes <= nSamples; i += nLanes)
     {
-        const auto oMore = hn::Add(hn::LoadU(oTag, pBefore + i),
-                                   hn::PromoteTo(oTag, hn::LoadU(oByteTag, pEntering + i)));
-        hn::StoreU(hn::Sub(oMore, hn::PromoteTo(oTag, hn::LoadU(oByteTag, pLeaving + i))), oTag,
-                   &oAfter[i]);
+        const auto oValid = hn::Ne(hn::LoadU(oTag, pValid + i), hn::Zero(oTag));
+        hn::StoreMaskBits(oTag, oValid, pBits + i / 8);
     }
-    for (; i < oAfter.size(); ++i)
+    for (; i < nSamples; i += 8)
     {
-        oAfter[i] = pBefore[i] + pEntering[i] - pLeaving[i];
+        unsigned int nBits = 0;
+        for (std::size_t k = 0; k < std::min<std::size_t>(8, nSamples - i); ++k)
+        {
+            nBits |= (pValid[i + k] != 0 ? 1U : 0U) << k;
+        }
+        pBits[i / 8] = static_cast<unsigned char>(nBits);
     }
 }
 
-void SumCounts(const std::int32_t* pColumns, std::size_t nWindow, std::span<double> oCounts)
+/// pOut[i] = oFunction(i) up to a whole vector.
+template <class D, class Function>
+HWY_INLINE void FillCounts(D oTag, std::int32_t* pOut, std::size_t nCounts,
+                           const Function& oFunction)
+{
+    for (std::size_t i = 0; i < nCounts; i += hn::Lanes(oTag))
+    {
+        hn::StoreU(oFunction(i), oTag, pOut + i);
+    }
+}
+
+void CountValid(const unsigned char* pValid, std::size_t nCount, std::size_t nStep,
+                std::int32_t* pScratch, std::span<std::int32_t> oCounts)
+{
+    const hn::CappedTag<std::int32_t, kCountPadding> oTag;
+    const hn::Rebind<std::uint8_t, decltype(oTag)> oByteTag;
+    // The window is cut into stretches as long as its binary digits say: pScratch[i] counts the
+    // valid samples in a stretch of nLength from i on.
+    std::size_t nScratch = oCounts.size() + (nCount - 1) * nStep;
+    FillCounts(oTag, pScratch, nScratch,
+               [&](std::size_t i) HWY_ATTR
+               { return hn::PromoteTo(oTag, hn::LoadU(oByteTag, pValid + i)); });
+    std::fill(oCounts.begin(), oCounts.end(), 0);
+    std::size_t nDone = 0;
+    for (std::size_t nLength = 1; nLength <= nCount; nLength *= 2)
+    {
+        if ((nCount & nLength) != 0)
+        {
+            const std::int32_t* pStretch = pScratch + nDone * nStep;
+            FillCounts(
+                oTag, oCounts.data(), oCounts.size(),
+                [&](std::size_t i) HWY_ATTR
+                { return hn::Add(hn::LoadU(oTag, &oCounts[i]), hn::LoadU(oTag, pStretch + i)); });
+            nDone += nLength;
+        }
+        if (2 * nLength <= nCount)
+        {
+            nScratch -= nLength * nStep;
+            const std::int32_t* pNext = pScratch + nLength * nStep;
+            FillCounts(
+                oTag, pScratch, nScratch,
+                [&](std::size_t i) HWY_ATTR
+                { return hn::Add(hn::LoadU(oTag, pScratch + i), hn::LoadU(oTag, pNext + i)); });
+        }
+    }
+}
+
+void AddCounts(const std::int32_t* pRow, std::span<std::int32_t> oCounts)
+{
+    for (std::size_t i = 0; i < oCounts.size(); ++i)
+    {
+        oCounts[i] += pRow[i];
+    }
+}
+
+void SlideCounts(const std::int32_t* pLeaving, const std::int32_t* pEntering, std::int32_t* pCounts,
+                 std::span<double> oCounts)
 {
     const hn::Rebind<std::int32_t, Doubles> oIntTag;
     for (std::size_t i = 0; i < oCounts.size(); i += kLanes)
     {
-        auto oSum = hn::LoadU(oIntTag, pColumns + i);
-        for (std::size_t k = 1; k < nWindow; ++k)
-        {
-            oSum = hn::Add(oSum, hn::LoadU(oIntTag, pColumns + i + k));
-        }
-        hn::StoreU(hn::PromoteTo(kTag, oSum), kTag, &oCounts[i]);
+        const auto oLess =
+            hn::Sub(hn::LoadU(oIntTag, pCounts + i), hn::LoadU(oIntTag, pLeaving + i));
+        const auto oAfter = hn::Add(oLess, hn::LoadU(oIntTag, pEntering + i));
+        hn::StoreU(oAfter, oIntTag, pCounts + i);
+        hn::StoreU(hn::PromoteTo(kTag, oAfter), kTag, &oCounts[i]);
+    }
+}
+
+void LoadCounts(const std::int32_t* pCounts, std::span<double> oCounts)
+{
+    const hn::Rebind<std::int32_t, Doubles> oIntTag;
+    for (std::size_t i = 0; i < oCounts.size(); i += kLanes)
+    {
+        hn::StoreU(hn::PromoteTo(kTag, hn::LoadU(oIntTag, pCounts + i)), kTag, &oCounts[i]);
     }
 }
 
@@ -408,18 +659,22 @@ HWY_EXPORT(SlideWindows);
 HWY_EXPORT(ClearMasked);
 HWY_EXPORT(SelectValid);
 HWY_EXPORT(StreamRow);
+HWY_EXPORT(PackValid);
+HWY_EXPORT(CountValid);
 HWY_EXPORT(SlideCounts);
-HWY_EXPORT(SumCounts);
+HWY_EXPORT(AddCounts);
+HWY_EXPORT(LoadCounts);
 
-void AddRow(const double* pRow, bool bSquared, std::span<double> oSums)
+void AddRow(const double* pRow, const unsigned char* pValid, double* pSums, double* pSquares,
+            std::size_t nCount)
 {
-    HWY_DYNAMIC_DISPATCH(AddRow)(pRow, bSquared, oSums);
+    HWY_DYNAMIC_DISPATCH(AddRow)(pRow, pValid, pSums, pSquares, nCount);
 }
 
-void SlideColumns(const BatchRows& oRows, std::size_t nFirst, bool bSquared,
-                  std::span<double> oSums, BatchColumn* poBatch)
+void SlideColumns(const BatchRows& oRows, std::size_t nFirst, std::size_t nCount,
+                  const ColumnSums& oSums, const ColumnSums& oSquares)
 {
-    HWY_DYNAMIC_DISPATCH(SlideColumns)(oRows, nFirst, bSquared, oSums, poBatch);
+    HWY_DYNAMIC_DISPATCH(SlideColumns)(oRows, nFirst, nCount, oSums, oSquares);
 }
 
 void SumWindows(const double* pColumns, std::size_t nCount, std::size_t nStep,
@@ -434,11 +689,10 @@ void SumBatchWindow(const BatchColumn* poBatch, std::size_t nCount, std::size_t 
     HWY_DYNAMIC_DISPATCH(SumBatchWindow)(poBatch, nCount, nStep, oWindow);
 }
 
-void SlideWindows(const BatchColumn* poColumns, std::size_t nSpan, std::size_t nSamples,
-                  std::size_t nChannels, BatchColumn* poSums,
-                  const std::array<double*, kBatchRows>& apRows)
+void SlideWindows(std::span<const WindowTrack> oTracks, std::size_t nSpan, std::size_t nSamples,
+                  std::size_t nChannels)
 {
-    HWY_DYNAMIC_DISPATCH(SlideWindows)(poColumns, nSpan, nSamples, nChannels, poSums, apRows);
+    HWY_DYNAMIC_DISPATCH(SlideWindows)(oTracks, nSpan, nSamples, nChannels);
 }
 
 void ClearMasked(const unsigned char* pValid, const double* pIn, std::span<double> oOut)
@@ -457,15 +711,31 @@ void StreamRow(std::span<const double> oIn, double* pOut)
     HWY_DYNAMIC_DISPATCH(StreamRow)(oIn, pOut);
 }
 
-void SlideCounts(const std::int32_t* pBefore, const unsigned char* pLeaving,
-                 const unsigned char* pEntering, std::span<std::int32_t> oAfter)
+void PackValid(const unsigned char* pValid, std::size_t nSamples, unsigned char* pBits)
 {
-    HWY_DYNAMIC_DISPATCH(SlideCounts)(pBefore, pLeaving, pEntering, oAfter);
+    HWY_DYNAMIC_DISPATCH(PackValid)(pValid, nSamples, pBits);
 }
 
-void SumCounts(const std::int32_t* pColumns, std::size_t nWindow, std::span<double> oCounts)
+void CountValid(const unsigned char* pValid, std::size_t nCount, std::size_t nStep,
+                std::int32_t* pScratch, std::span<std::int32_t> oCounts)
 {
-    HWY_DYNAMIC_DISPATCH(SumCounts)(pColumns, nWindow, oCounts);
+    HWY_DYNAMIC_DISPATCH(CountValid)(pValid, nCount, nStep, pScratch, oCounts);
+}
+
+void SlideCounts(const std::int32_t* pLeaving, const std::int32_t* pEntering, std::int32_t* pCounts,
+                 std::span<double> oCounts)
+{
+    HWY_DYNAMIC_DISPATCH(SlideCounts)(pLeaving, pEntering, pCounts, oCounts);
+}
+
+void AddCounts(const std::int32_t* pRow, std::span<std::int32_t> oCounts)
+{
+    HWY_DYNAMIC_DISPATCH(AddCounts)(pRow, oCounts);
+}
+
+void LoadCounts(const std::int32_t* pCounts, std::span<double> oCounts)
+{
+    HWY_DYNAMIC_DISPATCH(LoadCounts)(pCounts, oCounts);
 }
 
 }  // namespace kor::filters::kernels
