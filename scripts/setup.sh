@@ -5,6 +5,7 @@ declare -A PACKAGES=(
     [test]="libgtest-dev"
     [bench]="libbenchmark-dev"
     [files]="time gdal-bin"
+    [peers]="python3-numpy python3-scipy python3-opencv"
 )
 
 stage() # TEXT
