@@ -23,11 +23,9 @@ std::unique_ptr<IDataset> OpenForReading(const std::string& oFile, int nFlag)
 
 BasicReader::BasicReader(std::unique_ptr<IDataset> poOwned, IDataset* poDataset,
                          const std::vector<unsigned int>& oChannels)
-    : mpoOwned(std::move(poOwned)),
-      moSet(mpoOwned ? mpoOwned.get() : poDataset, oChannels, false),
-      moType(moSet.GetCommonType())
+    : ChannelAccess(std::move(poOwned), poDataset, oChannels, false),
+      moType(GetSet().GetCommonType())
 {
-    SetTileSize(moSet.GetDataset().GetTileWidth(), moSet.GetDataset().GetTileHeight());
 }
 
 BasicReader::BasicReader(IDataset* poDataset, const std::vector<unsigned int>& oChannels)
@@ -41,34 +39,9 @@ BasicReader::BasicReader(const std::string& oFile, const std::vector<unsigned in
 {
 }
 
-unsigned int BasicReader::GetWidth() const
-{
-    return moSet.GetDataset().GetWidth();
-}
-
-unsigned int BasicReader::GetHeight() const
-{
-    return moSet.GetDataset().GetHeight();
-}
-
-unsigned int BasicReader::GetChannelCount() const
-{
-    return static_cast<unsigned int>(moSet.GetChannels().size());
-}
-
 void BasicReader::ReadRaster(tessel::Raster* poRaster)
 {
-    moSet.ReadRaster(poRaster, moType, GetEdgeMode());
-}
-
-const ogc::cs::GeocodingInfo& BasicReader::GetGeocodingInfo() const
-{
-    return moSet.GetDataset().GetGeocodingInfo();
-}
-
-AuxiliaryData BasicReader::GetAuxiliaryData() const
-{
-    return moSet.GetAuxiliaryData();
+    GetSet().ReadRaster(poRaster, moType, GetEdgeMode());
 }
 
 }  // namespace kor::datasources

@@ -4,7 +4,7 @@
 #include <string>
 #include <vector>
 
-#include "platform/datasources/channelset.h"
+#include "platform/datasources/channelaccess.h"
 #include "platform/datasources/irasterreader.h"
 
 namespace kor::datasources
@@ -22,7 +22,7 @@ namespace kor::datasources
 ///          cannot be opened.
 /// Threads  one reader serves one thread at a time; several readers over one dataset may work at
 ///          once.
-class BasicReader : public IRasterReader
+class BasicReader : public IRasterReader, public ChannelAccess
 {
 public:
     /// oChannels: channel numbers from 1, in the order in which the raster is to hold them. Borrows
@@ -31,13 +31,8 @@ public:
     /// Opens the file itself, for reading, whether nFlag is 0 or 1; kor::DataException for others.
     BasicReader(const std::string& oFile, const std::vector<unsigned int>& oChannels, int nFlag);
 
-    unsigned int GetWidth() const override;
-    unsigned int GetHeight() const override;
-    unsigned int GetChannelCount() const override;
     tessel::DataType GetDataType() const override { return moType; }
     void ReadRaster(tessel::Raster* poRaster) override;
-    const ogc::cs::GeocodingInfo& GetGeocodingInfo() const override;
-    AuxiliaryData GetAuxiliaryData() const override;
 
 protected:
     /// Over poOwned, or where that is null over poDataset.
@@ -45,8 +40,6 @@ protected:
                 const std::vector<unsigned int>& oChannels);
 
 private:
-    std::unique_ptr<IDataset> mpoOwned;  ///< null where the dataset is the caller's
-    ChannelSet moSet;
     tessel::DataType moType;
 };
 

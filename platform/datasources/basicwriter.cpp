@@ -7,13 +7,11 @@
 namespace kor::datasources
 {
 
-BasicWriter::BasicWriter(std::unique_ptr<IRasterDataset> poOwned, IRasterDataset* poDataset,
+BasicWriter::BasicWriter(std::unique_ptr<IDataset> poOwned, IDataset* poDataset,
                          const std::vector<unsigned int>& oChannels)
-    : mpoOwned(std::move(poOwned)),
-      moSet(mpoOwned ? mpoOwned.get() : poDataset, oChannels, true),
-      moType(moSet.GetCommonType())
+    : ChannelAccess(std::move(poOwned), poDataset, oChannels, true),
+      moType(GetSet().GetCommonType())
 {
-    SetTileSize(moSet.GetDataset().GetTileWidth(), moSet.GetDataset().GetTileHeight());
 }
 
 BasicWriter::BasicWriter(IRasterDataset* poDataset, const std::vector<unsigned int>& oChannels)
@@ -31,58 +29,34 @@ BasicWriter::BasicWriter(IBitmapDataset* poDataset, unsigned int nBitmap)
 {
 }
 
-unsigned int BasicWriter::GetWidth() const
-{
-    return moSet.GetDataset().GetWidth();
-}
-
-unsigned int BasicWriter::GetHeight() const
-{
-    return moSet.GetDataset().GetHeight();
-}
-
-unsigned int BasicWriter::GetChannelCount() const
-{
-    return static_cast<unsigned int>(moSet.GetChannels().size());
-}
-
 void BasicWriter::ReadRaster(tessel::Raster* poRaster)
 {
-    moSet.ReadRaster(poRaster, moType, GetEdgeMode());
+    GetSet().ReadRaster(poRaster, moType, GetEdgeMode());
 }
 
 void BasicWriter::WriteRaster(const tessel::Raster* poRaster)
 {
-    RequireFittingRaster(poRaster, moType, GetChannelCount(), moSet.GetFileName());
-    Guarded(moSet.GetFileName(),
+    RequireFittingRaster(poRaster, moType, GetChannelCount(), GetSet().GetFileName());
+    Guarded(GetSet().GetFileName(),
             [&]
             {
-                WriteBlock(
-                    *poRaster, {GetWidth(), GetHeight()},
-                    [&](const PixelWindow& oWindow, const unsigned char* pSamples,
-                        const SampleStrides& oStrides)
-                    { moSet.GetIO().Write(moSet.GetChannels(), oWindow, pSamples, oStrides); });
+                WriteBlock(*poRaster, {GetWidth(), GetHeight()},
+                           [&](const PixelWindow& oWindow, const unsigned char* pSamples,
+                               const SampleStrides& oStrides) {
+                               GetSet().GetIO().Write(GetSet().GetChannels(), oWindow, pSamples,
+                                                      oStrides);
+                           });
             });
-}
-
-const ogc::cs::GeocodingInfo& BasicWriter::GetGeocodingInfo() const
-{
-    return moSet.GetDataset().GetGeocodingInfo();
-}
-
-AuxiliaryData BasicWriter::GetAuxiliaryData() const
-{
-    return moSet.GetAuxiliaryData();
 }
 
 void BasicWriter::SetAuxiliaryData(const AuxiliaryData& oData)
 {
-    moSet.SetAuxiliaryData(oData);
+    GetSet().SetAuxiliaryData(oData);
 }
 
 void BasicWriter::Flush()
 {
-    Guarded(moSet.GetFileName(), [&] { moSet.GetDataset().Flush(); });
+    Guarded(GetSet().GetFileName(), [&] { GetSet().GetDataset().Flush(); });
 }
 
 }  // namespace kor::datasources

@@ -4,7 +4,7 @@
 #include <memory>
 #include <vector>
 
-#include "platform/datasources/channelset.h"
+#include "platform/datasources/channelaccess.h"
 #include "platform/datasources/ibitmapdataset.h"
 #include "platform/datasources/irasterwriter.h"
 
@@ -22,7 +22,7 @@ namespace kor::datasources
 ///          was opened for reading.
 /// Threads  one writer serves one thread at a time; several writers and readers over one dataset
 ///          may work at once, on different channels or blocks.
-class BasicWriter : public IRasterWriter
+class BasicWriter : public IRasterWriter, public ChannelAccess
 {
 public:
     /// oChannels: channel numbers from 1, in the order in which the rasters hold them. Borrows the
@@ -34,23 +34,16 @@ public:
     /// nBitmap: number of the bitmap from 1. Borrows the dataset.
     BasicWriter(IBitmapDataset* poDataset, unsigned int nBitmap);
 
-    unsigned int GetWidth() const override;
-    unsigned int GetHeight() const override;
-    unsigned int GetChannelCount() const override;
     tessel::DataType GetDataType() const override { return moType; }
     void ReadRaster(tessel::Raster* poRaster) override;
     void WriteRaster(const tessel::Raster* poRaster) override;
-    const ogc::cs::GeocodingInfo& GetGeocodingInfo() const override;
-    AuxiliaryData GetAuxiliaryData() const override;
     void SetAuxiliaryData(const AuxiliaryData& oData) override;
     void Flush() override;
 
 private:
-    BasicWriter(std::unique_ptr<IRasterDataset> poOwned, IRasterDataset* poDataset,
+    BasicWriter(std::unique_ptr<IDataset> poOwned, IDataset* poDataset,
                 const std::vector<unsigned int>& oChannels);
 
-    std::unique_ptr<IRasterDataset> mpoOwned;  ///< null where the dataset is the caller's
-    ChannelSet moSet;
     tessel::DataType moType;
 };
 

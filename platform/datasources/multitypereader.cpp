@@ -1,10 +1,10 @@
 #include "platform/datasources/multitypereader.h"
 
 #include <algorithm>
-#include <cstring>
 
 #include "basic/core/typedispatch/typelist.h"
 #include "platform/datasources/blocktransfer.h"
+#include "platform/datasources/copysamples.h"
 #include "platform/datasources/datatypename.h"
 #include "platform/datasources/guard.h"
 #include "processes/qrdfilters/samplerows.h"
@@ -45,85 +45,42 @@ void ConvertElements(const tessel::DataType& oIn, const unsigned char* pIn,
     VisitType<StandardTypeList>(ElementIndex(oIn), oFromType, [] {});
 }
 
-/// Spreads samples that lie side by side over pixels of nStride bytes.
-void Spread(const unsigned char* pIn, std::size_t nSampleBytes, std::size_t nCount,
-            unsigned char* pOut, std::size_t nStride)
-{
-    const auto oCopy = [&](auto nFixedBytes)
-    {
-        for (std::size_t i = 0; i < nCount; ++i)
-        {
-            std::memcpy(pOut + i * nStride, pIn + i * nFixedBytes(), nFixedBytes());
-        }
-    };
-    // A copy of a fixed number of bytes is one move, of a variable number a call.
-    switch (nSampleBytes)
-    {
-        case 1:
-            return oCopy(std::integral_constant<std::size_t, 1>());
-        case 2:
-            return oCopy(std::integral_constant<std::size_t, 2>());
-        case 4:
-            return oCopy(std::integral_constant<std::size_t, 4>());
-        case 8:
-            return oCopy(std::integral_constant<std::size_t, 8>());
-        default:
-            return oCopy(std::integral_constant<std::size_t, 16>());
-    }
-}
-
 }  // namespace
 
 MultiTypeReader::MultiTypeReader(IDataset* poDataset, const std::vector<unsigned int>& oChannels,
                                  const tessel::DataType& oType)
-    : moSet(poDataset, oChannels, false), moType(oType)
+    : ChannelAccess(nullptr, poDataset, oChannels, false), moType(oType)
 {
     if (oType == tessel::eDT_BIT || ElementIndex(oType) == kElementTypes)
     {
         throw DataException(
-            moSet.GetFileName() + ": channels cannot be seen as " + DataTypeName(oType), kSource,
+            GetSet().GetFileName() + ": channels cannot be seen as " + DataTypeName(oType), kSource,
             __PRETTY_FUNCTION__, __LINE__);
     }
-    for (const unsigned int nChannel : moSet.GetChannels())
+    for (const unsigned int nChannel : GetSet().GetChannels())
     {
-        const tessel::DataType oOwn = moSet.GetDataset().GetChannelType(nChannel);
+        const tessel::DataType oOwn = GetSet().GetDataset().GetChannelType(nChannel);
         if (oOwn.mbComplex != oType.mbComplex || ElementIndex(oOwn) == kElementTypes)
         {
-            throw DataException(moSet.GetFileName() + ": channel " + std::to_string(nChannel) +
+            throw DataException(GetSet().GetFileName() + ": channel " + std::to_string(nChannel) +
                                     " has " + DataTypeName(oOwn) + " and cannot be seen as " +
                                     DataTypeName(oType),
                                 kSource, __PRETTY_FUNCTION__, __LINE__);
         }
     }
-    SetTileSize(moSet.GetDataset().GetTileWidth(), moSet.GetDataset().GetTileHeight());
-}
-
-unsigned int MultiTypeReader::GetWidth() const
-{
-    return moSet.GetDataset().GetWidth();
-}
-
-unsigned int MultiTypeReader::GetHeight() const
-{
-    return moSet.GetDataset().GetHeight();
-}
-
-unsigned int MultiTypeReader::GetChannelCount() const
-{
-    return static_cast<unsigned int>(moSet.GetChannels().size());
 }
 
 void MultiTypeReader::ReadRaster(tessel::Raster* poRaster)
 {
-    RequireFittingRaster(poRaster, moType, GetChannelCount(), moSet.GetFileName());
-    Guarded(moSet.GetFileName(),
+    RequireFittingRaster(poRaster, moType, GetChannelCount(), GetSet().GetFileName());
+    Guarded(GetSet().GetFileName(),
             [&]
             {
                 ReadBlock(*poRaster, {GetWidth(), GetHeight()}, GetEdgeMode(),
                           [&](const PixelWindow& oWindow, unsigned char* pSamples,
                               const SampleStrides& oStrides)
                           {
-                              for (std::size_t c = 0; c < moSet.GetChannels().size(); ++c)
+                              for (std::size_t c = 0; c < GetSet().GetChannels().size(); ++c)
                               {
                                   ReadChannel(c, oWindow, pSamples + c * oStrides.mnChannel,
                                               oStrides);
@@ -135,11 +92,11 @@ void MultiTypeReader::ReadRaster(tessel::Raster* poRaster)
 void MultiTypeReader::ReadChannel(std::size_t nIndex, const PixelWindow& oWindow,
                                   unsigned char* pSamples, const SampleStrides& oStrides)
 {
-    const auto oChannel = moSet.GetChannels().subspan(nIndex, 1);
-    const tessel::DataType oOwn = moSet.GetDataset().GetChannelType(oChannel[0]);
+    const auto oChannel = GetSet().GetChannels().subspan(nIndex, 1);
+    const tessel::DataType oOwn = GetSet().GetDataset().GetChannelType(oChannel[0]);
     if (oOwn == moType)
     {
-        moSet.GetIO().Read(oChannel, oWindow, pSamples, oStrides);
+        GetSet().GetIO().Read(oChannel, oWindow, pSamples, oStrides);
         return;
     }
     const std::size_t nOwnBytes = oOwn.GetSampleBytes();
@@ -153,25 +110,16 @@ void MultiTypeReader::ReadChannel(std::size_t nIndex, const PixelWindow& oWindow
     {
         oStrip.mnY = oWindow.mnY + nDone;
         oStrip.mnHeight = std::min(nRows, oWindow.mnHeight - nDone);
-        moSet.GetIO().Read(oChannel, oStrip, mvnRows.data(), {nOwnBytes, nOwnBytes, nRowBytes});
+        GetSet().GetIO().Read(oChannel, oStrip, mvnRows.data(), {nOwnBytes, nOwnBytes, nRowBytes});
         for (std::uint32_t y = 0; y < oStrip.mnHeight; ++y)
         {
             ConvertElements(oOwn, mvnRows.data() + y * nRowBytes, moType, mvnConverted.data(),
                             std::size_t{oWindow.mnWidth} * (moType.mbComplex ? 2U : 1U));
-            Spread(mvnConverted.data(), moType.GetSampleBytes(), oWindow.mnWidth,
-                   pSamples + (nDone + y) * oStrides.mnLine, oStrides.mnPixel);
+            CopySamples(moType.GetSampleBytes(), oWindow.mnWidth, mvnConverted.data(),
+                        moType.GetSampleBytes(), pSamples + (nDone + y) * oStrides.mnLine,
+                        oStrides.mnPixel);
         }
     }
-}
-
-const ogc::cs::GeocodingInfo& MultiTypeReader::GetGeocodingInfo() const
-{
-    return moSet.GetDataset().GetGeocodingInfo();
-}
-
-AuxiliaryData MultiTypeReader::GetAuxiliaryData() const
-{
-    return moSet.GetAuxiliaryData();
 }
 
 }  // namespace kor::datasources

@@ -2,7 +2,7 @@
 
 #include <vector>
 
-#include "platform/datasources/channelset.h"
+#include "platform/datasources/channelaccess.h"
 #include "platform/datasources/irasterreader.h"
 
 namespace kor::datasources
@@ -19,7 +19,7 @@ namespace kor::datasources
 ///          real type or the reverse, or when oType is not one of the ten element types, real or
 ///          complex.
 /// Threads  one reader serves one thread at a time.
-class MultiTypeReader : public IRasterReader
+class MultiTypeReader : public IRasterReader, public ChannelAccess
 {
 public:
     /// oChannels: channel numbers from 1, in the order in which the raster is to hold them. Borrows
@@ -27,19 +27,13 @@ public:
     MultiTypeReader(IDataset* poDataset, const std::vector<unsigned int>& oChannels,
                     const tessel::DataType& oType);
 
-    unsigned int GetWidth() const override;
-    unsigned int GetHeight() const override;
-    unsigned int GetChannelCount() const override;
     tessel::DataType GetDataType() const override { return moType; }
     void ReadRaster(tessel::Raster* poRaster) override;
-    const ogc::cs::GeocodingInfo& GetGeocodingInfo() const override;
-    AuxiliaryData GetAuxiliaryData() const override;
 
 private:
     void ReadChannel(std::size_t nIndex, const PixelWindow& oWindow, unsigned char* pSamples,
                      const SampleStrides& oStrides);
 
-    ChannelSet moSet;
     tessel::DataType moType;
     std::vector<unsigned char> mvnRows;       ///< samples as the file has them
     std::vector<unsigned char> mvnConverted;  ///< one row of them, converted

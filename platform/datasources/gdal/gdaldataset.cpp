@@ -389,7 +389,8 @@ void GdalDataset::SetBitmapAuxiliaryData(const AuxiliaryData& oData, unsigned in
         {
             oAll.SetChannel(itEntry->second, static_cast<unsigned int>(oBitmap.mnBand));
         }
-        else if (itEntry->second != AuxiliaryData::Channel())
+        else if (!itEntry->second.moDescription.empty() || !itEntry->second.moMetadata.empty() ||
+                 itEntry->second.mdfNoData)
         {
             throw DataException(moFile + ": the mask of a file of the format " +
                                     mpoFile->GetFormat() +

@@ -2,9 +2,9 @@
 
 #include <algorithm>
 #include <cstring>
-#include <type_traits>
 
 #include "basic/tessel/mask/mask.h"
+#include "platform/datasources/copysamples.h"
 
 namespace kor::datasources
 {
@@ -15,33 +15,6 @@ namespace
 /// Samples that do not lie as the file has them are moved in strips of this many bytes, so that
 /// they stay in the cache from one channel to the next.
 constexpr std::size_t kStripBytes = 1 << 18;
-
-/// Copies nCount samples, each a number of bytes behind the one before.
-void CopySamples(std::size_t nBytes, std::size_t nCount, const unsigned char* pIn,
-                 std::size_t nInStride, unsigned char* pOut, std::size_t nOutStride)
-{
-    const auto oCopy = [&](auto nFixedBytes)
-    {
-        for (std::size_t i = 0; i < nCount; ++i)
-        {
-            std::memcpy(pOut + i * nOutStride, pIn + i * nInStride, nFixedBytes());
-        }
-    };
-    // A copy of a fixed number of bytes is one move, of a variable number a call.
-    switch (nBytes)
-    {
-        case 1:
-            return oCopy(std::integral_constant<std::size_t, 1>());
-        case 2:
-            return oCopy(std::integral_constant<std::size_t, 2>());
-        case 4:
-            return oCopy(std::integral_constant<std::size_t, 4>());
-        case 8:
-            return oCopy(std::integral_constant<std::size_t, 8>());
-        default:
-            return oCopy(std::integral_constant<std::size_t, 16>());
-    }
-}
 
 /// Bits from bit nFirst of pBits on as bytes 0 or 1.
 void ExpandBits(const unsigned char* pBits, std::size_t nFirst, std::size_t nCount,
