@@ -4,6 +4,7 @@
 #include <cmath>
 
 #include "processes/qrdfilters/background.h"
+#include "processes/qrdfilters/kernels/exponentialrow.h"
 #include "processes/qrdfilters/kernels/frostrows.h"
 #include "processes/qrdfilters/kernels/windowsums.h"
 
@@ -29,13 +30,15 @@ void AppendDistances(const Window& oWindow, std::vector<double>& vdfDistances)
 
 DistanceWeights::DistanceWeights(const tessel::Raster& oIn, const tessel::Mask* poMaskIn,
                                  const tessel::Mask* poMaskOut, const Window& oWindow,
-                                 std::span<const double> vdfDistances, MaskedDistances eMasked)
+                                 std::span<const double> vdfDistances, MaskedDistances eMasked,
+                                 WeightExponential eExponential)
     : moIn(oIn),
       mpoMaskIn(poMaskIn),
       mpoMaskOut(poMaskOut),
       moWindow(oWindow),
       mnChannels(oIn.mnChannels),
       meMasked(eMasked),
+      meExponential(eExponential),
       moValid(poMaskIn, oWindow),
       mvpRows(oWindow.GetHeight()),
       mvdfMeans(kWeightedSamples)
@@ -141,7 +144,7 @@ void DistanceWeights::WeighPart(const WindowStatistics& oStretch, std::size_t nF
     {
         return;
     }
-    RaiseWeights(nFirst);
+    RaiseWeights(nFirst, nSamples);
     for (std::size_t r = 0; r < mvpRows.size(); ++r)
     {
         const std::int64_t y =
@@ -171,9 +174,15 @@ bool DistanceWeights::IsAnyWhole(std::size_t nFirst) const
                        [&](std::size_t i) { return moValid.IsWhole((nFirst + i) / mnChannels); });
 }
 
-void DistanceWeights::RaiseWeights(std::size_t nFirst)
+void DistanceWeights::RaiseWeights(std::size_t nFirst, std::size_t nSamples)
 {
     const double* pCoefficients = &moRow.mvdfCoefficients[nFirst];
+    if (meExponential == WeightExponential::eVector)
+    {
+        kernels::RaiseWeights({pCoefficients, PadRow(nSamples)}, mvdfDistances, mvdfWeights.data(),
+                              kWeightedSamples);
+        return;
+    }
     double* pWeights = mvdfWeights.data();
     for (const double dfDistance : mvdfDistances)
     {

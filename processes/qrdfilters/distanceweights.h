@@ -24,6 +24,13 @@ enum class MaskedDistances
     eInPlace   ///< each pixel of the window has its own entry
 };
 
+/// Where the weights come from.
+enum class WeightExponential
+{
+    eLibrary,  ///< std::exp
+    eVector    ///< several at once, at most 1 ulp off
+};
+
 /// Means of windows whose samples are weighted by exp(-(A * distance)), with a coefficient A for
 /// each window:
 ///
@@ -37,7 +44,8 @@ public:
     /// vdfDistances has an entry for each pixel of the window. The masks may be null.
     DistanceWeights(const tessel::Raster& oIn, const tessel::Mask* poMaskIn,
                     const tessel::Mask* poMaskOut, const Window& oWindow,
-                    std::span<const double> vdfDistances, MaskedDistances eMasked);
+                    std::span<const double> vdfDistances, MaskedDistances eMasked,
+                    WeightExponential eExponential);
 
     /// What becomes of each sample of a stretch: the weighted mean where mvdfWeighted is not 0,
     /// else the value of mvdfFixed.
@@ -59,7 +67,7 @@ private:
     void ClearMasked(const WindowStatistics& oStretch);
     void WeighPart(const WindowStatistics& oStretch, std::size_t nFirst, std::size_t nSamples,
                    double* pOut);
-    void RaiseWeights(std::size_t nFirst);
+    void RaiseWeights(std::size_t nFirst, std::size_t nSamples);
     void FindMeans(std::size_t nSamples);
     void FindMeansInPlace(std::size_t nFirst, std::size_t nSamples);
     double ShiftedMean(std::size_t nFirst, std::size_t i) const;
@@ -71,6 +79,7 @@ private:
     Window moWindow;
     std::size_t mnChannels;
     MaskedDistances meMasked;
+    WeightExponential meExponential;
 
     std::vector<double> mvdfDistances;       ///< distinct ones, ascending
     std::vector<double> mvdfWeights;         ///< of each distance, for the samples of a part
