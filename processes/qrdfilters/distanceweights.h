@@ -67,11 +67,12 @@ private:
     void ClearMasked(const WindowStatistics& oStretch);
     void WeighPart(const WindowStatistics& oStretch, std::size_t nFirst, std::size_t nSamples,
                    double* pOut);
+    void FindTaken(std::size_t nFirst, std::size_t nSamples);
     void RaiseWeights(std::size_t nFirst, std::size_t nSamples);
-    void FindMeans(std::size_t nSamples);
-    void FindMeansInPlace(std::size_t nFirst, std::size_t nSamples);
+    void FindMeans(std::size_t nFirst, std::size_t nSamples, double* pOut);
+    void FindMeansInPlace(std::size_t nFirst, std::size_t nSamples, double* pOut);
+    void FindShiftedMeans(std::size_t nFirst, std::size_t nSamples, double* pOut);
     double ShiftedMean(std::size_t nFirst, std::size_t i) const;
-    bool IsAnyWhole(std::size_t nFirst) const;
 
     const tessel::Raster& moIn;
     const tessel::Mask* mpoMaskIn;
@@ -94,7 +95,6 @@ private:
     // Of the part at hand, kWeightedSamples samples of it at the most.
     std::vector<const double*> mvpRows;  ///< of the windows
     std::vector<std::size_t> mvnTaken;   ///< samples that are weighted
-    std::vector<double> mvdfMeans;
     std::vector<double> mvdfTail;
 };
 

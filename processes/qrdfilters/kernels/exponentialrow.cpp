@@ -73,15 +73,20 @@ HWY_INLINE Vector BeyondLinear(Vector r)
 }
 
 /// exp(x) = 2^k * exp(r), x = k * ln(2) + r.
-HWY_INLINE Vector Exponential(Vector oArgument)
+struct Parts
 {
-    // Beyond these the result is 0 or infinite. A NaN may become anything here.
-    const Vector x = hn::Min(hn::Max(oArgument, Constant(-760.0)), Constant(720.0));
+    Vector oShiftedK;  ///< k + kInteger
+    Vector oExpR;
+};
+
+/// |x| is at most 1000.
+HWY_INLINE Parts Split(Vector x)
+{
+    const Vector oShifted =
+        hn::Add(hn::Mul(x, Constant(1.44269504088896338700e+00)), Constant(kInteger));
+    const Vector k = hn::Sub(oShifted, Constant(kInteger));
     // ln(2) in two parts; the first has 32 bits, so that its product with k is exact, and so is
     // what it leaves of x.
-    const Vector k =
-        hn::Sub(hn::Add(hn::Mul(x, Constant(1.44269504088896338700e+00)), Constant(kInteger)),
-                Constant(kInteger));
     const Vector oHigh = hn::Sub(x, hn::Mul(k, Constant(6.93147180369123816490e-01)));
     const Vector oLow = hn::Mul(k, Constant(1.90821492927058770002e-10));
     const Vector r = hn::Sub(oHigh, oLow);
@@ -91,13 +96,46 @@ HWY_INLINE Vector Exponential(Vector oArgument)
     const Vector oLinear = hn::Add(oOne, r);
     const Vector oLinearRest = hn::Sub(r, hn::Sub(oLinear, oOne));
     const Vector oSmall = hn::Add(BeyondLinear(r), hn::Mul(oRest, oLinear));
-    const Vector oExp = hn::Add(oLinear, hn::Add(oLinearRest, oSmall));
+    return {oShifted, hn::Add(oLinear, hn::Add(oLinearRest, oSmall))};
+}
 
-    // 2^k itself may be no double where the result is one. The second product alone rounds.
+/// For any argument. 2^k itself may be no double where the result is one: it is multiplied in two
+/// steps, of which the second alone rounds.
+HWY_NOINLINE Vector AnyExponential(Vector oArgument)
+{
+    // Beyond these the result is 0 or infinite. A NaN may become anything here.
+    const Vector x = hn::Min(hn::Max(oArgument, Constant(-760.0)), Constant(720.0));
+    const Parts oParts = Split(x);
+    const Vector k = hn::Sub(oParts.oShiftedK, Constant(kInteger));
     const Power oFirst = PowerOfTwo(hn::Mul(k, Constant(0.5)));
     const Power oSecond = PowerOfTwo(hn::Sub(k, oFirst.oExponent));
-    const Vector oResult = hn::Mul(hn::Mul(oExp, oFirst.oValue), oSecond.oValue);
+    const Vector oResult = hn::Mul(hn::Mul(oParts.oExpR, oFirst.oValue), oSecond.oValue);
     return hn::IfThenElse(hn::Eq(oArgument, oArgument), oResult, oArgument);
+}
+
+HWY_INLINE Vector Exponential(Vector oArgument)
+{
+    // From -708 to 708 all results are normal: k is added to their exponent.
+    const auto oUsual = hn::Lt(hn::Abs(oArgument), Constant(708.0));
+    if (HWY_UNLIKELY(!hn::AllTrue(kTag, oUsual)))
+    {
+        return AnyExponential(oArgument);
+    }
+    const Parts oParts = Split(oArgument);
+    const hn::RebindToUnsigned<Doubles> oBits;
+    const auto oExponent = hn::ShiftLeft<52>(hn::BitCast(oBits, oParts.oShiftedK));
+    return hn::BitCast(kTag, hn::Add(hn::BitCast(oBits, oParts.oExpR), oExponent));
+}
+
+/// Distance 0 without the way through the exponential.
+HWY_INLINE void RaiseCentre(std::span<const double> oCoefficients, double* pWeights)
+{
+    for (std::size_t i = 0; i < oCoefficients.size(); i += kLanes)
+    {
+        // 1, or not a number where the coefficient is not finite.
+        const Vector oProduct = hn::Mul(hn::LoadU(kTag, &oCoefficients[i]), hn::Zero(kTag));
+        hn::StoreU(hn::Sub(Constant(1.0), oProduct), kTag, pWeights + i);
+    }
 }
 
 void RaiseWeights(std::span<const double> oCoefficients, std::span<const double> oDistances,
@@ -105,11 +143,18 @@ void RaiseWeights(std::span<const double> oCoefficients, std::span<const double>
 {
     for (const double dfDistance : oDistances)
     {
-        const Vector oDistance = Constant(dfDistance);
-        for (std::size_t i = 0; i < oCoefficients.size(); i += kLanes)
+        if (dfDistance == 0.0)
         {
-            const Vector oProduct = hn::Mul(hn::LoadU(kTag, &oCoefficients[i]), oDistance);
-            hn::StoreU(Exponential(hn::Neg(oProduct)), kTag, pWeights + i);
+            RaiseCentre(oCoefficients, pWeights);
+        }
+        else
+        {
+            const Vector oDistance = Constant(-dfDistance);
+            for (std::size_t i = 0; i < oCoefficients.size(); i += kLanes)
+            {
+                const Vector oCoefficient = hn::LoadU(kTag, &oCoefficients[i]);
+                hn::StoreU(Exponential(hn::Mul(oCoefficient, oDistance)), kTag, pWeights + i);
+            }
         }
         pWeights += nPitch;
     }
