@@ -55,6 +55,15 @@ void BM_FilterFfrost(benchmark::State& oState)
     Run(oState, oFilter);
 }
 
+/// The same with the library's own exponential.
+void BM_FilterFfrostFast(benchmark::State& oState)
+{
+    filters::FilterFfrost oFilter;
+    oFilter.SetDamp(1.0);
+    oFilter.SetFastExponential(true);
+    Run(oState, oFilter);
+}
+
 /// FilterFefrost the same way: of one look, about half of the pixels are weighted.
 void BM_FilterFefrost(benchmark::State& oState)
 {
@@ -62,6 +71,16 @@ void BM_FilterFefrost(benchmark::State& oState)
     oFilter.SetDamp(1.0);
     oFilter.SetNLOOK(1.0);
     oFilter.SetFilterSize(7, 7);
+    Run(oState, oFilter);
+}
+
+void BM_FilterFefrostFast(benchmark::State& oState)
+{
+    filters::FilterFefrost oFilter;
+    oFilter.SetDamp(1.0);
+    oFilter.SetNLOOK(1.0);
+    oFilter.SetFilterSize(7, 7);
+    oFilter.SetFastExponential(true);
     Run(oState, oFilter);
 }
 
@@ -135,6 +154,8 @@ void BM_FilterFfrostPlain(benchmark::State& oState)
 
 BENCHMARK(BM_FilterFfrost)->ArgName("masked")->Arg(0)->Arg(1)->Unit(benchmark::kMillisecond);
 BENCHMARK(BM_FilterFfrostPlain)->ArgName("masked")->Arg(0)->Arg(1)->Unit(benchmark::kMillisecond);
+BENCHMARK(BM_FilterFfrostFast)->ArgName("masked")->Arg(0)->Arg(1)->Unit(benchmark::kMillisecond);
+BENCHMARK(BM_FilterFefrostFast)->ArgName("masked")->Arg(0)->Arg(1)->Unit(benchmark::kMillisecond);
 BENCHMARK(BM_FilterFefrost)->ArgName("masked")->Arg(0)->Arg(1)->Unit(benchmark::kMillisecond);
 
 }  // namespace

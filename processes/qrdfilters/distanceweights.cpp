@@ -4,6 +4,7 @@
 #include <cmath>
 
 #include "processes/qrdfilters/background.h"
+#include "processes/qrdfilters/kernels/exponentialrow.h"
 #include "processes/qrdfilters/kernels/frostrows.h"
 #include "processes/qrdfilters/kernels/windowsums.h"
 
@@ -29,16 +30,17 @@ void AppendDistances(const Window& oWindow, std::vector<double>& vdfDistances)
 
 DistanceWeights::DistanceWeights(const tessel::Raster& oIn, const tessel::Mask* poMaskIn,
                                  const tessel::Mask* poMaskOut, const Window& oWindow,
-                                 std::span<const double> vdfDistances, MaskedDistances eMasked)
+                                 std::span<const double> vdfDistances, MaskedDistances eMasked,
+                                 WeightExponential eExponential)
     : moIn(oIn),
       mpoMaskIn(poMaskIn),
       mpoMaskOut(poMaskOut),
       moWindow(oWindow),
       mnChannels(oIn.mnChannels),
       meMasked(eMasked),
+      meExponential(eExponential),
       moValid(poMaskIn, oWindow),
-      mvpRows(oWindow.GetHeight()),
-      mvdfMeans(kWeightedSamples)
+      mvpRows(oWindow.GetHeight())
 {
     SortDistances(vdfDistances);
 }
@@ -127,21 +129,13 @@ void DistanceWeights::ClearMasked(const WindowStatistics& oStretch)
 void DistanceWeights::WeighPart(const WindowStatistics& oStretch, std::size_t nFirst,
                                 std::size_t nSamples, double* pOut)
 {
-    const double* pWeighted = &moRow.mvdfWeighted[nFirst];
-    mvnTaken.clear();
-    for (std::size_t i = 0; i < nSamples; ++i)
-    {
-        if (pWeighted[i] != 0.0)
-        {
-            mvnTaken.push_back(i);
-        }
-    }
-    std::copy_n(&moRow.mvdfFixed[nFirst], nSamples, pOut);
+    FindTaken(nFirst, nSamples);
     if (mvnTaken.empty())
     {
+        std::copy_n(&moRow.mvdfFixed[nFirst], nSamples, pOut);
         return;
     }
-    RaiseWeights(nFirst);
+    RaiseWeights(nFirst, nSamples);
     for (std::size_t r = 0; r < mvpRows.size(); ++r)
     {
         const std::int64_t y =
@@ -149,31 +143,41 @@ void DistanceWeights::WeighPart(const WindowStatistics& oStretch, std::size_t nF
         mvpRows[r] = moIn.GetPixelAs<const double>(-std::int64_t{moWindow.mnHalfX}, y) +
                      oStretch.mnFirst + nFirst;
     }
-    const bool bShifted = !moValid.IsAllValid() && meMasked == MaskedDistances::eShifted;
-    if (!moValid.IsAllValid() && !bShifted)
+    if (moValid.IsAllValid())
     {
-        FindMeansInPlace(nFirst, nSamples);
+        FindMeans(nFirst, nSamples, pOut);
     }
-    else if (!bShifted || IsAnyWhole(nFirst))
+    else if (meMasked == MaskedDistances::eInPlace)
     {
-        FindMeans(nSamples);
+        FindMeansInPlace(nFirst, nSamples, pOut);
     }
-    for (const std::size_t i : mvnTaken)
+    else
     {
-        const bool bWhole = !bShifted || moValid.IsWhole((nFirst + i) / mnChannels);
-        pOut[i] = bWhole ? mvdfMeans[i] : ShiftedMean(nFirst, i);
+        FindShiftedMeans(nFirst, nSamples, pOut);
     }
 }
 
-bool DistanceWeights::IsAnyWhole(std::size_t nFirst) const
+void DistanceWeights::FindTaken(std::size_t nFirst, std::size_t nSamples)
 {
-    return std::any_of(mvnTaken.begin(), mvnTaken.end(),
-                       [&](std::size_t i) { return moValid.IsWhole((nFirst + i) / mnChannels); });
+    mvnTaken.clear();
+    for (std::size_t i = 0; i < nSamples; ++i)
+    {
+        if (moRow.mvdfWeighted[nFirst + i] != 0.0)
+        {
+            mvnTaken.push_back(i);
+        }
+    }
 }
 
-void DistanceWeights::RaiseWeights(std::size_t nFirst)
+void DistanceWeights::RaiseWeights(std::size_t nFirst, std::size_t nSamples)
 {
     const double* pCoefficients = &moRow.mvdfCoefficients[nFirst];
+    if (meExponential == WeightExponential::eVector)
+    {
+        kernels::RaiseWeights({pCoefficients, PadRow(nSamples)}, mvdfDistances, mvdfWeights.data(),
+                              kWeightedSamples);
+        return;
+    }
     double* pWeights = mvdfWeights.data();
     for (const double dfDistance : mvdfDistances)
     {
@@ -189,12 +193,15 @@ void DistanceWeights::RaiseWeights(std::size_t nFirst)
 
 /// The means of windows in which all pixels are valid. Whole vectors are read where they lie; what
 /// is left at the end is copied first, since behind it the block may end.
-void DistanceWeights::FindMeans(std::size_t nSamples)
+void DistanceWeights::FindMeans(std::size_t nFirst, std::size_t nSamples, double* pOut)
 {
     const std::size_t nColumns = moWindow.GetWidth();
     const std::size_t nDirect = nSamples / kRowPadding * kRowPadding;
-    kernels::FindWeightedMeans({mvpRows, {}, nColumns, mnChannels, mvnWeightOf, mvdfWeights.data()},
-                               {mvdfMeans.data(), nDirect});
+    const double* pFixed = &moRow.mvdfFixed[nFirst];
+    const double* pWeighted = &moRow.mvdfWeighted[nFirst];
+    const double* pWeights = mvdfWeights.data();
+    kernels::FindWeightedMeans({mvpRows, {}, nColumns, mnChannels, mvnWeightOf, pWeights}, pFixed,
+                               pWeighted, {pOut, nDirect});
     if (nDirect == nSamples)
     {
         return;
@@ -209,13 +216,13 @@ void DistanceWeights::FindMeans(std::size_t nSamples)
         std::copy_n(pRow + nDirect, nSamples - nDirect + nLast, pTail);
         vpTails.push_back(pTail);
     }
-    kernels::FindWeightedMeans(
-        {vpTails, {}, nColumns, mnChannels, mvnWeightOf, mvdfWeights.data() + nDirect},
-        {mvdfMeans.data() + nDirect, kRowPadding});
+    kernels::FindWeightedMeans({vpTails, {}, nColumns, mnChannels, mvnWeightOf, pWeights + nDirect},
+                               pFixed + nDirect, pWeighted + nDirect,
+                               {pOut + nDirect, kRowPadding});
 }
 
 /// The means of windows with masked pixels, each valid one weighted by its own distance.
-void DistanceWeights::FindMeansInPlace(std::size_t nFirst, std::size_t nSamples)
+void DistanceWeights::FindMeansInPlace(std::size_t nFirst, std::size_t nSamples, double* pOut)
 {
     const std::size_t nPitch = mvdfCleared.size() / mvpRows.size();
     std::vector<const double*> vpCleared;
@@ -227,7 +234,28 @@ void DistanceWeights::FindMeansInPlace(std::size_t nFirst, std::size_t nSamples)
     }
     kernels::FindWeightedMeans(
         {vpCleared, vpBits, moWindow.GetWidth(), mnChannels, mvnWeightOf, mvdfWeights.data()},
-        {mvdfMeans.data(), PadRow(nSamples)});
+        &moRow.mvdfFixed[nFirst], &moRow.mvdfWeighted[nFirst], {pOut, PadRow(nSamples)});
+}
+
+/// The means of windows with masked pixels, the valid ones weighted by the distances in turn.
+void DistanceWeights::FindShiftedMeans(std::size_t nFirst, std::size_t nSamples, double* pOut)
+{
+    const auto oIsWhole = [&](std::size_t i) { return moValid.IsWhole((nFirst + i) / mnChannels); };
+    if (std::any_of(mvnTaken.begin(), mvnTaken.end(), oIsWhole))
+    {
+        FindMeans(nFirst, nSamples, pOut);
+    }
+    else
+    {
+        std::copy_n(&moRow.mvdfFixed[nFirst], nSamples, pOut);
+    }
+    for (const std::size_t i : mvnTaken)
+    {
+        if (!oIsWhole(i))
+        {
+            pOut[i] = ShiftedMean(nFirst, i);
+        }
+    }
 }
 
 /// The mean of one window with masked pixels.

@@ -24,6 +24,13 @@ enum class MaskedDistances
     eInPlace   ///< each pixel of the window has its own entry
 };
 
+/// Where the weights come from.
+enum class WeightExponential
+{
+    eLibrary,  ///< std::exp
+    eVector    ///< several at once, at most 1 ulp off
+};
+
 /// Means of windows whose samples are weighted by exp(-(A * distance)), with a coefficient A for
 /// each window:
 ///
@@ -37,7 +44,8 @@ public:
     /// vdfDistances has an entry for each pixel of the window. The masks may be null.
     DistanceWeights(const tessel::Raster& oIn, const tessel::Mask* poMaskIn,
                     const tessel::Mask* poMaskOut, const Window& oWindow,
-                    std::span<const double> vdfDistances, MaskedDistances eMasked);
+                    std::span<const double> vdfDistances, MaskedDistances eMasked,
+                    WeightExponential eExponential);
 
     /// What becomes of each sample of a stretch: the weighted mean where mvdfWeighted is not 0,
     /// else the value of mvdfFixed.
@@ -59,11 +67,12 @@ private:
     void ClearMasked(const WindowStatistics& oStretch);
     void WeighPart(const WindowStatistics& oStretch, std::size_t nFirst, std::size_t nSamples,
                    double* pOut);
-    void RaiseWeights(std::size_t nFirst);
-    void FindMeans(std::size_t nSamples);
-    void FindMeansInPlace(std::size_t nFirst, std::size_t nSamples);
+    void FindTaken(std::size_t nFirst, std::size_t nSamples);
+    void RaiseWeights(std::size_t nFirst, std::size_t nSamples);
+    void FindMeans(std::size_t nFirst, std::size_t nSamples, double* pOut);
+    void FindMeansInPlace(std::size_t nFirst, std::size_t nSamples, double* pOut);
+    void FindShiftedMeans(std::size_t nFirst, std::size_t nSamples, double* pOut);
     double ShiftedMean(std::size_t nFirst, std::size_t i) const;
-    bool IsAnyWhole(std::size_t nFirst) const;
 
     const tessel::Raster& moIn;
     const tessel::Mask* mpoMaskIn;
@@ -71,6 +80,7 @@ private:
     Window moWindow;
     std::size_t mnChannels;
     MaskedDistances meMasked;
+    WeightExponential meExponential;
 
     std::vector<double> mvdfDistances;       ///< distinct ones, ascending
     std::vector<double> mvdfWeights;         ///< of each distance, for the samples of a part
@@ -85,7 +95,6 @@ private:
     // Of the part at hand, kWeightedSamples samples of it at the most.
     std::vector<const double*> mvpRows;  ///< of the windows
     std::vector<std::size_t> mvnTaken;   ///< samples that are weighted
-    std::vector<double> mvdfMeans;
     std::vector<double> mvdfTail;
 };
 

@@ -59,6 +59,11 @@ void FilterFefrost::SetFilterSize(boost::optional<int> nSizeX, boost::optional<i
     moFilterSizeY = nSizeY;
 }
 
+void FilterFefrost::SetFastExponential(bool bFast)
+{
+    mbFastExponential = bFast;
+}
+
 void FilterFefrost::Process(tessel::Raster* poRasterIn, tessel::Mask* poMaskIn,
                             tessel::Raster* poRasterOut, tessel::Mask* poMaskOut) const
 {
@@ -73,8 +78,9 @@ void FilterFefrost::ProcessBlock(tessel::Raster* poRasterIn, tessel::Mask* poMas
 
     std::vector<double> vdfDistances;
     AppendDistances(oWindow, vdfDistances);
-    DistanceWeights oWeights(*poRasterIn, poMaskIn, poMaskOut, oWindow, vdfDistances,
-                             MaskedDistances::eInPlace);
+    DistanceWeights oWeights(
+        *poRasterIn, poMaskIn, poMaskOut, oWindow, vdfDistances, MaskedDistances::eInPlace,
+        mbFastExponential ? WeightExponential::eVector : WeightExponential::eLibrary);
     const auto oFinish = [&](const WindowStatistics& oStretch, std::span<double> vdfOut)
     {
         DistanceWeights::Row& oRow = oWeights.GetRow(oStretch.GetPadded());

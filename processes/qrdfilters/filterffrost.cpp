@@ -56,6 +56,11 @@ void FilterFfrost::SetFilterSize(boost::optional<int> nSizeX, boost::optional<in
     moFilterSizeY = nSizeY;
 }
 
+void FilterFfrost::SetFastExponential(bool bFast)
+{
+    mbFastExponential = bFast;
+}
+
 void FilterFfrost::InitProcessing() const
 {
     if (moFilterSizeX && moFilterSizeY)
@@ -78,8 +83,9 @@ void FilterFfrost::ProcessBlock(tessel::Raster* poRasterIn, tessel::Mask* poMask
     RequireWindowInside(oWindow, *poRasterIn, poMaskIn, kSource);
 
     const std::vector<double> vdfDistances = DistancesOf(oWindow);
-    DistanceWeights oWeights(*poRasterIn, poMaskIn, poMaskOut, oWindow, vdfDistances,
-                             MaskedDistances::eShifted);
+    DistanceWeights oWeights(
+        *poRasterIn, poMaskIn, poMaskOut, oWindow, vdfDistances, MaskedDistances::eShifted,
+        mbFastExponential ? WeightExponential::eVector : WeightExponential::eLibrary);
     const auto oFinish = [&](const WindowStatistics& oStretch, std::span<double> vdfOut)
     {
         DistanceWeights::Row& oRow = oWeights.GetRow(oStretch.GetPadded());

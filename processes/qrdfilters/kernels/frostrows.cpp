@@ -77,7 +77,7 @@ void FindEnhancedFrostCoefficients(const WindowMoments& oMoments,
 
 /// The means of kVectors vectors of windows: as many sums under way hide the time of an addition.
 template <std::size_t kVectors, bool kMasked>
-HWY_INLINE void WeightVectors(const WeightedWindows& oWindows, std::size_t i, double* pMeans)
+HWY_INLINE void WeightVectors(const WeightedWindows& oWindows, std::size_t i, Vector* poMeans)
 {
     Vector aoSums[kVectors];
     Vector aoWeights[kVectors];
@@ -111,28 +111,41 @@ HWY_INLINE void WeightVectors(const WeightedWindows& oWindows, std::size_t i, do
     }
     for (std::size_t v = 0; v < kVectors; ++v)
     {
-        hn::StoreU(hn::Div(aoSums[v], aoWeights[v]), kTag, pMeans + v * kLanes);
+        poMeans[v] = hn::Div(aoSums[v], aoWeights[v]);
     }
 }
 
 template <bool kMasked>
-void WeightWindows(const WeightedWindows& oWindows, std::span<double> oMeans)
+void WeightWindows(const WeightedWindows& oWindows, const double* pFixed, const double* pWeighted,
+                   std::span<double> oOut)
 {
+    const auto oStore = [&](Vector oMean, std::size_t i)
+    {
+        const auto oFixed = hn::Eq(hn::LoadU(kTag, pWeighted + i), hn::Zero(kTag));
+        hn::StoreU(hn::IfThenElse(oFixed, hn::LoadU(kTag, pFixed + i), oMean), kTag, &oOut[i]);
+    };
+    Vector aoMeans[4];
     std::size_t i = 0;
-    for (; i + 4 * kLanes <= oMeans.size(); i += 4 * kLanes)
+    for (; i + 4 * kLanes <= oOut.size(); i += 4 * kLanes)
     {
-        WeightVectors<4, kMasked>(oWindows, i, &oMeans[i]);
+        WeightVectors<4, kMasked>(oWindows, i, aoMeans);
+        for (std::size_t v = 0; v < 4; ++v)
+        {
+            oStore(aoMeans[v], i + v * kLanes);
+        }
     }
-    for (; i < oMeans.size(); i += kLanes)
+    for (; i < oOut.size(); i += kLanes)
     {
-        WeightVectors<1, kMasked>(oWindows, i, &oMeans[i]);
+        WeightVectors<1, kMasked>(oWindows, i, aoMeans);
+        oStore(aoMeans[0], i);
     }
 }
 
-void FindWeightedMeans(const WeightedWindows& oWindows, std::span<double> oMeans)
+void FindWeightedMeans(const WeightedWindows& oWindows, const double* pFixed,
+                       const double* pWeighted, std::span<double> oOut)
 {
-    oWindows.oValid.empty() ? WeightWindows<false>(oWindows, oMeans)
-                            : WeightWindows<true>(oWindows, oMeans);
+    oWindows.oValid.empty() ? WeightWindows<false>(oWindows, pFixed, pWeighted, oOut)
+                            : WeightWindows<true>(oWindows, pFixed, pWeighted, oOut);
 }
 
 }  // namespace kor::filters::kernels::HWY_NAMESPACE
@@ -159,9 +172,10 @@ void FindEnhancedFrostCoefficients(const WindowMoments& oMoments,
     HWY_DYNAMIC_DISPATCH(FindEnhancedFrostCoefficients)(oMoments, oLimits, nSamples, oRow);
 }
 
-void FindWeightedMeans(const WeightedWindows& oWindows, std::span<double> oMeans)
+void FindWeightedMeans(const WeightedWindows& oWindows, const double* pFixed,
+                       const double* pWeighted, std::span<double> oOut)
 {
-    HWY_DYNAMIC_DISPATCH(FindWeightedMeans)(oWindows, oMeans);
+    HWY_DYNAMIC_DISPATCH(FindWeightedMeans)(oWindows, pFixed, pWeighted, oOut);
 }
 
 }  // namespace kor::filters::kernels

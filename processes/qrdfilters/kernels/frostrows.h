@@ -61,8 +61,9 @@ struct WeightedWindows
     const double* pWeights;  ///< of the first sample; those of the next ones follow
 };
 
-/// oMeans[i] = (0 + w * x + ...) / (0 + w + ...) over the pixels of window i in row order. At most
-/// kWeightedSamples.
-void FindWeightedMeans(const WeightedWindows& oWindows, std::span<double> oMeans);
+/// oOut[i] = (0 + w * x + ...) / (0 + w + ...) over the pixels of window i in row order, or
+/// pFixed[i] where pWeighted[i] is 0. At most kWeightedSamples.
+void FindWeightedMeans(const WeightedWindows& oWindows, const double* pFixed,
+                       const double* pWeighted, std::span<double> oOut);
 
 }  // namespace kor::filters::kernels

@@ -225,6 +225,33 @@ TEST(FilterFefrost, ObjectServesSeveralThreads)
     EXPECT_EQ(voResults, (std::vector<Image<double>>(4, Filtered(oFilter, {{3, 8, 19}}))));
 }
 
+// Positive samples: a weight that is 1 ulp off moves the mean by as little.
+TEST(FilterFefrost, FastExponentialMovesTheResultByLittle)
+{
+    Random oRandom(44);
+    const auto poIn = RandomRaster(90, 20, 1, eDT_64R, Margins{3, 3}, Samples::Ordinary, oRandom);
+    for (std::size_t i = 0; i < poIn->mnBufferSize / sizeof(double); ++i)
+    {
+        double& dfSample = reinterpret_cast<double*>(poIn->mpBuffer)[i];
+        dfSample = std::fabs(dfSample);
+    }
+    const auto poMask = RandomMask(90, 20, Margins{3, 3}, 0.9, oRandom);
+    const auto poExact = BlankRaster(90, 20, 1, eDT_64R);
+    const auto poFast = BlankRaster(90, 20, 1, eDT_64R);
+    FilterFefrost oFilter = EnhancedFrost(10.0, 1.0);
+    oFilter.SetFilterSize(7, 7);
+    oFilter.Process(poIn.get(), poMask.get(), poExact.get(), nullptr);
+    oFilter.SetFastExponential(true);
+    oFilter.Process(poIn.get(), poMask.get(), poFast.get(), nullptr);
+    const std::vector<double> vdfExact = ImageOf<double>(*poExact).Samples();
+    const std::vector<double> vdfFast = ImageOf<double>(*poFast).Samples();
+    EXPECT_NE(vdfExact, vdfFast);
+    for (std::size_t i = 0; i < vdfExact.size(); ++i)
+    {
+        ASSERT_NEAR(vdfFast[i], vdfExact[i], 2e-15 * vdfExact[i]);
+    }
+}
+
 struct Case
 {
     boost::optional<int> nSizeX;

@@ -3,11 +3,14 @@
 #include <gtest/gtest.h>
 
 #include <cmath>
+#include <functional>
 #include <string>
 #include <thread>
 #include <vector>
 
 #include "platform/exception/exception.h"
+#include "processes/qrdfilters/kernels/exponentialrow.h"
+#include "processes/qrdfilters/kernels/windowsums.h"
 #include "tests/support/blocks.h"
 #include "tests/support/localstatisticsreference.h"
 
@@ -320,11 +323,13 @@ TEST(FilterFfrost, CallOperatorKeepsMarginsAndOffsets)
     EXPECT_EQ(ImageOf<double>(*poOut), (Image<double>{{4}}));
 }
 
+using Exponential = std::function<double(double)>;
+
 /// The filter as it is defined, one exponential for each pixel of each window.
-void FrostByDefinition(const tessel::Raster& oIn, const tessel::Mask* poMaskIn,
-                       const boost::optional<int>& nSizeX, const boost::optional<int>& nSizeY,
-                       double dfDamp, bool bBGZero, const tessel::Raster& oOut,
-                       const tessel::Mask* poMaskOut)
+void FrostByDefinition(const Exponential& oExponential, const tessel::Raster& oIn,
+                       const tessel::Mask* poMaskIn, const boost::optional<int>& nSizeX,
+                       const boost::optional<int>& nSizeY, double dfDamp, bool bBGZero,
+                       const tessel::Raster& oOut, const tessel::Mask* poMaskOut)
 {
     const int nMarginX = static_cast<int>(oIn.mnMarginX);
     const int nMarginY = static_cast<int>(oIn.mnMarginY);
@@ -369,7 +374,7 @@ void FrostByDefinition(const tessel::Raster& oIn, const tessel::Mask* poMaskIn,
                         {
                             continue;
                         }
-                        const double w = std::exp(-(A * vdfDistances[k]));
+                        const double w = oExponential(-(A * vdfDistances[k]));
                         dfSum += w * oIn.GetPixelAs<double>(x + dx, y + dy)[c];
                         dfWeights += w;
                         k += 1;
@@ -379,6 +384,20 @@ void FrostByDefinition(const tessel::Raster& oIn, const tessel::Mask* poMaskIn,
             }
         }
     }
+}
+
+double LibraryExponential(double x)
+{
+    return std::exp(x);
+}
+
+double FastExponential(double x)
+{
+    const std::vector<double> vdfCoefficients(kernels::kRowPadding, -x);
+    std::vector<double> vdfWeights(kernels::kRowPadding);
+    kernels::RaiseWeights(vdfCoefficients, std::vector<double>{1.0}, vdfWeights.data(),
+                          kernels::kRowPadding);
+    return vdfWeights[0];
 }
 
 void CompareWithDefinition(std::uint32_t nMostWidth, Samples eSamples, Random& oRandom)
@@ -413,10 +432,38 @@ void CompareWithDefinition(std::uint32_t nMostWidth, Samples eSamples, Random& o
     tessel::Mask* poMaskOut = oRandom() % 2 == 0 ? poClip.get() : nullptr;
     const auto poActual = BlankRaster(nWidth, nHeight, nChannels, eDT_64R, Margins{1, 2});
     const auto poExpected = BlankRaster(nWidth, nHeight, nChannels, eDT_64R, Margins{1, 2});
+    const bool bFast = oRandom() % 4 == 0;
+    oFilter.SetFastExponential(bFast);
     oFilter.Process(poIn.get(), poMaskIn, poActual.get(), poMaskOut);
-    FrostByDefinition(*poIn, poMaskIn, nSizeX, nSizeY, dfDamp, bBGZero, *poExpected, poMaskOut);
+    FrostByDefinition(bFast ? FastExponential : LibraryExponential, *poIn, poMaskIn, nSizeX, nSizeY,
+                      dfDamp, bBGZero, *poExpected, poMaskOut);
     ASSERT_TRUE(SameBits(*poActual, *poExpected))
         << nWidth << " x " << nHeight << " x " << nChannels << ", valid " << dfValid;
+}
+
+// Positive samples: a weight that is 1 ulp off moves the mean by as little.
+TEST(FilterFfrost, FastExponentialMovesTheResultByLittle)
+{
+    Random oRandom(42);
+    const auto poIn = RandomRaster(90, 20, 1, eDT_64R, Margins{3, 3}, Samples::Ordinary, oRandom);
+    for (std::size_t i = 0; i < poIn->mnBufferSize / sizeof(double); ++i)
+    {
+        double& dfSample = reinterpret_cast<double*>(poIn->mpBuffer)[i];
+        dfSample = std::fabs(dfSample);
+    }
+    const auto poExact = BlankRaster(90, 20, 1, eDT_64R);
+    const auto poFast = BlankRaster(90, 20, 1, eDT_64R);
+    FilterFfrost oFilter = Frost(1.0);
+    oFilter.Process(poIn.get(), nullptr, poExact.get(), nullptr);
+    oFilter.SetFastExponential(true);
+    oFilter.Process(poIn.get(), nullptr, poFast.get(), nullptr);
+    const std::vector<double> vdfExact = ImageOf<double>(*poExact).Samples();
+    const std::vector<double> vdfFast = ImageOf<double>(*poFast).Samples();
+    EXPECT_NE(vdfExact, vdfFast);
+    for (std::size_t i = 0; i < vdfExact.size(); ++i)
+    {
+        ASSERT_NEAR(vdfFast[i], vdfExact[i], 2e-15 * vdfExact[i]);
+    }
 }
 
 TEST(FilterFfrost, GivesTheBitsOfTheDefinition)

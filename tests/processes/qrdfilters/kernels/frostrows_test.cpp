@@ -137,7 +137,9 @@ TEST_P(FrostRows, MeansAreThoseOfTheDefinition)
             {
                 oWindows.oValid = vpBits;
             }
-            FindWeightedMeans(oWindows, vdfMeans);
+            const std::vector<double> vdfFixed = RandomRow(nSamples);
+            const std::vector<double> vdfWeighted = RandomCounts(nSamples);
+            FindWeightedMeans(oWindows, vdfFixed.data(), vdfWeighted.data(), vdfMeans);
             for (std::size_t i = 0; i < nSamples; ++i)
             {
                 double dfSum = 0.0;
@@ -152,7 +154,8 @@ TEST_P(FrostRows, MeansAreThoseOfTheDefinition)
                         dfWeights += w;
                     }
                 }
-                ASSERT_TRUE(SameSample(vdfMeans[i], dfSum / dfWeights)) << i << " " << bMasked;
+                const double dfExpected = vdfWeighted[i] != 0.0 ? dfSum / dfWeights : vdfFixed[i];
+                ASSERT_TRUE(SameSample(vdfMeans[i], dfExpected)) << i << " " << bMasked;
             }
         }
     }
