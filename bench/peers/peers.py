@@ -58,7 +58,7 @@ def box_statistics(image, window=7):
 def window_filters():
     image = speckle(np.float64)
     out = np.empty_like(image)
-    tell("BM_FilterAverage<double>/masked:0/channels:1", "OpenCV boxFilter",
+    tell("BM_FilterAverage<double>/channels:1/masked:0", "OpenCV boxFilter",
          lambda: cv2.boxFilter(image, -1, (7, 7), dst=out))
     update, mean, variance, scratch = box_statistics(image)
 
@@ -102,12 +102,12 @@ def window_filters():
         cv2.boxFilter(image, -1, (7, 7), dst=mean)
         np.subtract(image, mean, out=out)
 
-    tell("BM_FilterStdDeviation/masked:0", "OpenCV boxes", deviation)
-    tell("BM_FilterFle<1>/masked:0", "OpenCV boxes", lee)
-    tell("BM_FilterKuan/masked:0", "OpenCV boxes", kuan)
-    tell("BM_FilterLaplacian/masked:0", "OpenCV boxes", laplacian)
+    tell("BM_FilterStdDeviation/channels:1/masked:0", "OpenCV boxes", deviation)
+    tell("BM_FilterFle<1>/channels:1/masked:0", "OpenCV boxes", lee)
+    tell("BM_FilterKuan/channels:1/masked:0", "OpenCV boxes", kuan)
+    tell("BM_FilterLaplacian/channels:1/masked:0", "OpenCV boxes", laplacian)
     with np.errstate(all="ignore"):
-        tell("BM_FilterGamma/masked:0", "NumPy, SciPy", gamma)
+        tell("BM_FilterGamma/channels:1/masked:0", "NumPy, SciPy", gamma)
 
 
 def medians():
@@ -128,7 +128,7 @@ def stencils():
     out = np.empty_like(image)
     kernel = np.exp(-np.arange(-4.0, 5.0) ** 2 / 8.0)
     kernel /= kernel.sum()
-    tell("BM_FilterGauss", "OpenCV sepFilter2D",
+    tell("BM_FilterGauss/side:9/kernels:1/masked:0", "OpenCV sepFilter2D",
          lambda: cv2.sepFilter2D(image, -1, kernel, kernel, dst=out))
     down = np.empty_like(image)
 
@@ -137,13 +137,13 @@ def stencils():
         cv2.Sobel(image, cv2.CV_64F, 0, 1, dst=down)
         cv2.magnitude(out, down, magnitude=out)
 
-    tell("BM_FilterSobel", "OpenCV Sobel, magnitude", sobel)
+    tell("BM_FilterSobel/masked:0", "OpenCV Sobel, magnitude", sobel)
     names = {np.uint8: "unsigned char", np.float32: "float", np.float64: "double"}
     for dtype, name in names.items():
         image = speckle(dtype)
         for side in (5, 9):
             weights = np.random.default_rng(1).random((side, side)) / (side * side)
-            tell(f"BM_FilterCustom<{name}>/side:{side}", "OpenCV filter2D",
+            tell(f"BM_FilterCustom<{name}>/side:{side}/masked:0", "OpenCV filter2D",
                  lambda: cv2.filter2D(image, -1, weights))
 
 
