@@ -317,36 +317,22 @@ void ModeSelection<T>::SelectByVotes(const Band& oBand) const
 {
     Election<Lane<T>, TRank> oElection(moWindow, moIn.mnChannels, mbThinLine);
     const std::size_t nRow = std::size_t{moIn.mnWidth} * moIn.mnChannels;
-    const auto nReach = static_cast<std::int64_t>(oElection.GetReach());
-    const auto nFrame = static_cast<std::int64_t>(moWindow.mnHalfX * moIn.mnChannels);
     std::vector<double> vdfModes(oElection.GetSamples());
     for (std::size_t nFirst = 0; nFirst < nRow; nFirst += vdfModes.size())
     {
         const std::size_t nSamples = std::min(vdfModes.size(), nRow - nFirst);
         const std::span<double> vdfTile(vdfModes.data(), nSamples);
         const auto oLoad = [&](std::int64_t y, std::span<Lane<T>> oLanes)
+        { LoadTile(y, nFirst, oElection.GetReach(), oLanes); };
+        const auto oTake = [&](std::int64_t y, const TRank* pIndex)
         {
-            // Lanes beside the row and its frame are in no window, and stay 0.
-            const std::int64_t nStart = static_cast<std::int64_t>(nFirst) - nReach;
-            const std::int64_t nLeft = std::max(nStart, -nFrame);
-            const std::int64_t nRight = std::min(nStart + static_cast<std::int64_t>(oLanes.size()),
-                                                 static_cast<std::int64_t>(nRow) + nFrame);
-            std::fill(oLanes.begin(), oLanes.end(), Lane<T>(0));
-            LoadLanes<T>(moIn.GetPixelAs<const T>(0, y) + nLeft,
-                         oLanes.subspan(static_cast<std::size_t>(nLeft - nStart),
-                                        static_cast<std::size_t>(nRight - nLeft)));
-        };
-        const auto oTake = [&](std::int64_t nOut, const TRank* pIndex)
-        {
-            const auto y = static_cast<std::uint32_t>(nOut);
-            const T* pIn = moIn.GetPixelAs<const T>(0, nOut) + nFirst;
+            const T* pIn = moIn.GetPixelAs<const T>(0, y) + nFirst;
             for (std::size_t i = 0; i < nSamples; ++i)
             {
-                vdfTile[i] = ConvertSample<T, double>(
-                    pIn[static_cast<std::ptrdiff_t>(i) + mvnOffsets[pIndex[i]]]);
+                vdfTile[i] = ConvertSample<T, double>(pIn[mvnOffsets[pIndex[i]]]);
+                ++pIn;
             }
-            FindModesAlone(oBand, y, nFirst, vdfTile);
-            oBand.moTake(y, nFirst, vdfTile);
+            Finish(oBand, static_cast<std::uint32_t>(y), nFirst, vdfTile);
         };
         const std::size_t nLast = nFirst + nSamples - 1;
         if (oBand.IsVoted(nFirst / moIn.mnChannels, nLast / moIn.mnChannels + 1))
@@ -356,10 +342,38 @@ void ModeSelection<T>::SelectByVotes(const Band& oBand) const
         }
         for (std::uint32_t y = oBand.mnFirst; y < oBand.mnEnd; ++y)
         {
-            FindModesAlone(oBand, y, nFirst, vdfTile);
-            oBand.moTake(y, nFirst, vdfTile);
+            Finish(oBand, y, nFirst, vdfTile);
         }
     }
+}
+
+/// Loads the lanes of row y from nReach samples before sample nFirst on. Those beside the row and
+/// its frame are in no window, and are 0.
+template <class T>
+template <class TLane>
+void ModeSelection<T>::LoadTile(std::int64_t y, std::size_t nFirst, std::size_t nReach,
+                                std::span<TLane> oLanes) const
+{
+    const std::int64_t nChannels = moIn.mnChannels;
+    const std::int64_t nFrame = moWindow.mnHalfX * nChannels;
+    const std::int64_t nStart =
+        static_cast<std::int64_t>(nFirst) - static_cast<std::int64_t>(nReach);
+    const std::int64_t nLeft = std::max(nStart, -nFrame);
+    const std::int64_t nRight = std::min(nStart + static_cast<std::int64_t>(oLanes.size()),
+                                         moIn.mnWidth * nChannels + nFrame);
+    std::fill(oLanes.begin(), oLanes.end(), TLane(0));
+    LoadLanes<T>(moIn.GetPixelAs<const T>(0, y) + nLeft,
+                 oLanes.subspan(static_cast<std::size_t>(nLeft - nStart),
+                                static_cast<std::size_t>(nRight - nLeft)));
+}
+
+/// Adds the modes that are counted alone to a stretch of row y, and hands it out.
+template <class T>
+void ModeSelection<T>::Finish(const Band& oBand, std::uint32_t y, std::size_t nFirst,
+                              std::span<double> vdfModes) const
+{
+    FindModesAlone(oBand, y, nFirst, vdfModes);
+    oBand.moTake(y, nFirst, vdfModes);
 }
 
 /// Selects the modes of pixels that are all counted alone.
@@ -369,8 +383,7 @@ void ModeSelection<T>::SelectAlone(const Band& oBand) const
     std::vector<double> vdfModes(std::size_t{moIn.mnWidth} * moIn.mnChannels);
     for (std::uint32_t y = oBand.mnFirst; y < oBand.mnEnd; ++y)
     {
-        FindModesAlone(oBand, y, 0, vdfModes);
-        oBand.moTake(y, 0, vdfModes);
+        Finish(oBand, y, 0, vdfModes);
     }
 }
 

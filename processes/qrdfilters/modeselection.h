@@ -48,6 +48,11 @@ private:
     template <class TRank>
     void SelectByVotes(const Band& oBand) const;
     void SelectAlone(const Band& oBand) const;
+    template <class TLane>
+    void LoadTile(std::int64_t y, std::size_t nFirst, std::size_t nReach,
+                  std::span<TLane> oLanes) const;
+    void Finish(const Band& oBand, std::uint32_t y, std::size_t nFirst,
+                std::span<double> vdfModes) const;
     void FindModesAlone(const Band& oBand, std::uint32_t y, std::size_t nFirst,
                         std::span<double> vdfModes) const;
     double FindModeAlone(std::int64_t x, std::int64_t y, std::size_t c,
