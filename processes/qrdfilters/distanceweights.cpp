@@ -17,13 +17,13 @@ using kernels::PadRow;
 
 void AppendDistances(const Window& oWindow, std::vector<double>& vdfDistances)
 {
-    const double dfHalfX = oWindow.mnHalfX;
-    const double dfHalfY = oWindow.mnHalfY;
-    for (double dy = -dfHalfY; dy <= dfHalfY; dy += 1.0)
+    const std::int64_t nHalfX = oWindow.mnHalfX;
+    const std::int64_t nHalfY = oWindow.mnHalfY;
+    for (std::int64_t dy = -nHalfY; dy <= nHalfY; ++dy)
     {
-        for (double dx = -dfHalfX; dx <= dfHalfX; dx += 1.0)
+        for (std::int64_t dx = -nHalfX; dx <= nHalfX; ++dx)
         {
-            vdfDistances.push_back(std::sqrt(dx * dx + dy * dy));
+            vdfDistances.push_back(std::sqrt(static_cast<double>(dx * dx + dy * dy)));
         }
     }
 }
@@ -263,7 +263,7 @@ double DistanceWeights::ShiftedMean(std::size_t nFirst, std::size_t i) const
 {
     double dfSum = 0.0;
     double dfWeights = 0.0;
-    const std::uint32_t* pWeightOf = mvnWeightOf.data();
+    const auto* pWeightOf = mvnWeightOf.data();
     for (std::size_t r = 0; r < moWindow.GetHeight(); ++r)
     {
         const unsigned char* pValid = moValid.GetRow(r) + (nFirst + i) / mnChannels;

@@ -71,11 +71,11 @@ using StoreRow = void (*)(std::span<const double> vdfIn, void* pOut);
 /// All that a block needs and that does not depend on its sample types.
 struct TouziBlock
 {
-    kernels::TouziThresholds oThresholds;
-    SampleDomain eDomain;
-    bool bBGZero;
-    LoadRow pfnLoad;
-    StoreRow pfnStore;
+    kernels::TouziThresholds moThresholds;
+    SampleDomain meDomain;
+    bool mbBGZero;
+    LoadRow mpfnLoad;
+    StoreRow mpfnStore;
 };
 
 SampleDomain DomainOf(int nAmplit)
@@ -134,20 +134,20 @@ void FilterBlock(const tessel::Raster& oIn, const tessel::Mask* poMask, const te
         return;
     }
     constexpr std::uint32_t kReach = kernels::kTouziReach;
-    AmplitudeBand oBand(oIn, oBlock.eDomain, oBlock.pfnLoad, std::max(oIn.mnMarginX, kReach));
+    AmplitudeBand oBand(oIn, oBlock.meDomain, oBlock.mpfnLoad, std::max(oIn.mnMarginX, kReach));
     std::vector<unsigned char> vComputed(oIn.mnWidth);
     std::vector<double> vdfLine(std::size_t{oIn.mnWidth} * oIn.mnChannels);
     for (std::uint32_t y = 0; y < oIn.mnHeight; ++y)
     {
         oBand.MoveTo(y);
         FindComputedPixels(poMask, nullptr, 0, y, vComputed);
-        FilterRow(oBand, oBlock.oThresholds, vComputed, vdfLine);
-        if (!oBlock.bBGZero)
+        FilterRow(oBand, oBlock.moThresholds, vComputed, vdfLine);
+        if (!oBlock.mbBGZero)
         {
             CopyCentres(oBand, vComputed, vdfLine);
         }
-        FromAmplitude(oBlock.eDomain, vdfLine);
-        oBlock.pfnStore(vdfLine, oOut.GetPixel(0, y));
+        FromAmplitude(oBlock.meDomain, vdfLine);
+        oBlock.mpfnStore(vdfLine, oOut.GetPixel(0, y));
     }
 }
 

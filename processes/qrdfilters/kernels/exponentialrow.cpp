@@ -31,8 +31,8 @@ constexpr double kInteger = 6755399441055744.0;
 /// The integer next to x, and 2 to its power.
 struct Power
 {
-    Vector oExponent;
-    Vector oValue;
+    Vector moExponent;
+    Vector moValue;
 };
 
 /// |x| is at most 1000.
@@ -75,8 +75,8 @@ HWY_INLINE Vector BeyondLinear(Vector r)
 /// exp(x) = 2^k * exp(r), x = k * ln(2) + r.
 struct Parts
 {
-    Vector oShiftedK;  ///< k + kInteger
-    Vector oExpR;
+    Vector moShiftedK;  ///< k + kInteger
+    Vector moExpR;
 };
 
 /// |x| is at most 1000.
@@ -106,10 +106,10 @@ HWY_NOINLINE Vector AnyExponential(Vector oArgument)
     // Beyond these the result is 0 or infinite. A NaN may become anything here.
     const Vector x = hn::Min(hn::Max(oArgument, Constant(-760.0)), Constant(720.0));
     const Parts oParts = Split(x);
-    const Vector k = hn::Sub(oParts.oShiftedK, Constant(kInteger));
+    const Vector k = hn::Sub(oParts.moShiftedK, Constant(kInteger));
     const Power oFirst = PowerOfTwo(hn::Mul(k, Constant(0.5)));
-    const Power oSecond = PowerOfTwo(hn::Sub(k, oFirst.oExponent));
-    const Vector oResult = hn::Mul(hn::Mul(oParts.oExpR, oFirst.oValue), oSecond.oValue);
+    const Power oSecond = PowerOfTwo(hn::Sub(k, oFirst.moExponent));
+    const Vector oResult = hn::Mul(hn::Mul(oParts.moExpR, oFirst.moValue), oSecond.moValue);
     return hn::IfThenElse(hn::Eq(oArgument, oArgument), oResult, oArgument);
 }
 
@@ -123,8 +123,8 @@ HWY_INLINE Vector Exponential(Vector oArgument)
     }
     const Parts oParts = Split(oArgument);
     const hn::RebindToUnsigned<Doubles> oBits;
-    const auto oExponent = hn::ShiftLeft<52>(hn::BitCast(oBits, oParts.oShiftedK));
-    return hn::BitCast(kTag, hn::Add(hn::BitCast(oBits, oParts.oExpR), oExponent));
+    const auto oExponent = hn::ShiftLeft<52>(hn::BitCast(oBits, oParts.moShiftedK));
+    return hn::BitCast(kTag, hn::Add(hn::BitCast(oBits, oParts.moExpR), oExponent));
 }
 
 /// Distance 0 without the way through the exponential.

@@ -20,16 +20,16 @@ constexpr std::size_t kLanes = hn::MaxLanes(kTag);
 
 struct LocalMoments
 {
-    Vector oMean;
-    Vector oVariance;
+    Vector moMean;
+    Vector moVariance;
 };
 
 HWY_INLINE LocalMoments FindMoments(const WindowMoments& oMoments, std::size_t i)
 {
-    const Vector oCount = hn::LoadU(kTag, oMoments.pCounts + i);
-    const Vector oMean = hn::Div(hn::LoadU(kTag, oMoments.pSums + i), oCount);
+    const Vector oCount = hn::LoadU(kTag, oMoments.mpCounts + i);
+    const Vector oMean = hn::Div(hn::LoadU(kTag, oMoments.mpSums + i), oCount);
     const Vector oSquare = hn::Mul(hn::Mul(oMean, oCount), oMean);
-    const Vector oDeviations = hn::Sub(hn::LoadU(kTag, oMoments.pSumsOfSquares + i), oSquare);
+    const Vector oDeviations = hn::Sub(hn::LoadU(kTag, oMoments.mpSumsOfSquares + i), oSquare);
     return {oMean, hn::Div(oDeviations, hn::Sub(oCount, hn::Set(kTag, 1.0)))};
 }
 
@@ -41,12 +41,12 @@ void FindFrostCoefficients(const WindowMoments& oMoments, double dfDamp, std::si
     for (std::size_t i = 0; i < nSamples; i += kLanes)
     {
         const LocalMoments oLocal = FindMoments(oMoments, i);
-        const Vector oSquare = hn::Mul(oLocal.oMean, oLocal.oMean);
-        hn::StoreU(hn::Mul(hn::Div(oLocal.oVariance, oSquare), oDamp), kTag,
-                   oRow.pCoefficients + i);
-        hn::StoreU(hn::LoadU(kTag, oMoments.pCentres + i), kTag, oRow.pFixed + i);
-        const auto oSingle = hn::Eq(hn::LoadU(kTag, oMoments.pCounts + i), oOne);
-        hn::StoreU(hn::IfThenZeroElse(oSingle, oOne), kTag, oRow.pWeighted + i);
+        const Vector oSquare = hn::Mul(oLocal.moMean, oLocal.moMean);
+        hn::StoreU(hn::Mul(hn::Div(oLocal.moVariance, oSquare), oDamp), kTag,
+                   oRow.mpCoefficients + i);
+        hn::StoreU(hn::LoadU(kTag, oMoments.mpCentres + i), kTag, oRow.mpFixed + i);
+        const auto oSingle = hn::Eq(hn::LoadU(kTag, oMoments.mpCounts + i), oOne);
+        hn::StoreU(hn::IfThenZeroElse(oSingle, oOne), kTag, oRow.mpWeighted + i);
     }
 }
 
@@ -55,23 +55,23 @@ void FindEnhancedFrostCoefficients(const WindowMoments& oMoments,
                                    const WeightingRow& oRow)
 {
     const Vector oOne = hn::Set(kTag, 1.0);
-    const Vector oCu = hn::Set(kTag, oLimits.dfCu);
-    const Vector oCmax = hn::Set(kTag, oLimits.dfCmax);
-    const Vector oDamp = hn::Set(kTag, oLimits.dfDamp);
+    const Vector oCu = hn::Set(kTag, oLimits.mdfCu);
+    const Vector oCmax = hn::Set(kTag, oLimits.mdfCmax);
+    const Vector oDamp = hn::Set(kTag, oLimits.mdfDamp);
     for (std::size_t i = 0; i < nSamples; i += kLanes)
     {
         const LocalMoments oLocal = FindMoments(oMoments, i);
-        const Vector oCi = hn::Div(hn::Sqrt(oLocal.oVariance), oLocal.oMean);
+        const Vector oCi = hn::Div(hn::Sqrt(oLocal.moVariance), oLocal.moMean);
         const Vector oAboveCu = hn::Mul(hn::Sub(oCi, oCu), oDamp);
-        hn::StoreU(hn::Div(oAboveCu, hn::Sub(oCmax, oCi)), kTag, oRow.pCoefficients + i);
+        hn::StoreU(hn::Div(oAboveCu, hn::Sub(oCmax, oCi)), kTag, oRow.mpCoefficients + i);
 
         // Comparisons with a Ci that is not a number are false, which leaves the weighted mean.
         const auto oFlat = hn::Gt(oCu, oCi);
-        const auto oSingle = hn::Eq(hn::LoadU(kTag, oMoments.pCounts + i), oOne);
+        const auto oSingle = hn::Eq(hn::LoadU(kTag, oMoments.mpCounts + i), oOne);
         const auto oKept = hn::Or(hn::Gt(oCi, oCmax), oSingle);
-        const Vector oCentre = hn::LoadU(kTag, oMoments.pCentres + i);
-        hn::StoreU(hn::IfThenElse(oFlat, oLocal.oMean, oCentre), kTag, oRow.pFixed + i);
-        hn::StoreU(hn::IfThenZeroElse(hn::Or(oFlat, oKept), oOne), kTag, oRow.pWeighted + i);
+        const Vector oCentre = hn::LoadU(kTag, oMoments.mpCentres + i);
+        hn::StoreU(hn::IfThenElse(oFlat, oLocal.moMean, oCentre), kTag, oRow.mpFixed + i);
+        hn::StoreU(hn::IfThenZeroElse(hn::Or(oFlat, oKept), oOne), kTag, oRow.mpWeighted + i);
     }
 }
 
@@ -86,21 +86,21 @@ HWY_INLINE void WeightVectors(const WeightedWindows& oWindows, std::size_t i, Ve
         aoSums[v] = hn::Zero(kTag);
         aoWeights[v] = hn::Zero(kTag);
     }
-    const std::uint32_t* pWeightOf = oWindows.oWeightOf.data();
-    for (std::size_t r = 0; r < oWindows.oRows.size(); ++r)
+    const std::uint32_t* pWeightOf = oWindows.moWeightOf.data();
+    for (std::size_t r = 0; r < oWindows.moRows.size(); ++r)
     {
-        const double* pSample = oWindows.oRows[r] + i;
-        const std::uint64_t* pValid = kMasked ? oWindows.oValid[r] + i : nullptr;
-        for (std::size_t k = 0; k < oWindows.nColumns; ++k, pSample += oWindows.nStep)
+        const double* pSample = oWindows.moRows[r] + i;
+        const std::uint64_t* pValid = kMasked ? oWindows.moValid[r] + i : nullptr;
+        for (std::size_t k = 0; k < oWindows.mnColumns; ++k, pSample += oWindows.mnStep)
         {
-            const double* pWeight = oWindows.pWeights + *pWeightOf++ + i;
+            const double* pWeight = oWindows.mpWeights + *pWeightOf++ + i;
             for (std::size_t v = 0; v < kVectors; ++v)
             {
                 Vector oWeight = hn::LoadU(kTag, pWeight + v * kLanes);
                 if constexpr (kMasked)
                 {
                     const hn::RebindToUnsigned<Doubles> oBits;
-                    const auto oValid = hn::LoadU(oBits, pValid + k * oWindows.nStep + v * kLanes);
+                    const auto oValid = hn::LoadU(oBits, pValid + k * oWindows.mnStep + v * kLanes);
                     oWeight = hn::And(oWeight, hn::BitCast(kTag, oValid));
                 }
                 const Vector oSample = hn::LoadU(kTag, pSample + v * kLanes);
@@ -144,8 +144,8 @@ void WeightWindows(const WeightedWindows& oWindows, const double* pFixed, const 
 void FindWeightedMeans(const WeightedWindows& oWindows, const double* pFixed,
                        const double* pWeighted, std::span<double> oOut)
 {
-    oWindows.oValid.empty() ? WeightWindows<false>(oWindows, pFixed, pWeighted, oOut)
-                            : WeightWindows<true>(oWindows, pFixed, pWeighted, oOut);
+    oWindows.moValid.empty() ? WeightWindows<false>(oWindows, pFixed, pWeighted, oOut)
+                             : WeightWindows<true>(oWindows, pFixed, pWeighted, oOut);
 }
 
 }  // namespace kor::filters::kernels::HWY_NAMESPACE

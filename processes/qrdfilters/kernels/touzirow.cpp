@@ -60,9 +60,9 @@ class Neighbours
 {
 public:
     Neighbours(const TouziRows& oRows, const TouziThresholds& oThresholds, std::size_t nFirst)
-        : mpSamples(oRows.oSamples.data() + oRows.nReach),
-          mpSquares(oRows.oSquares.data() + oRows.nReach),
-          mnMargin(oThresholds.nMargin),
+        : mpSamples(oRows.moSamples.data() + oRows.mnReach),
+          mpSquares(oRows.moSquares.data() + oRows.mnReach),
+          mnMargin(oThresholds.mnMargin),
           mnFirst(static_cast<std::ptrdiff_t>(nFirst))
     {
     }
@@ -87,14 +87,14 @@ private:
 /// Columns of one row of a window, none where the first lies behind the last.
 struct Columns
 {
-    int nFirst;
-    int nLast;
+    int mnFirst;
+    int mnLast;
 };
 
 /// Sum of the samples of one row, added to what is there.
 HWY_INLINE void AddRow(const Neighbours& oPixels, int dy, Columns oColumns, FloatVector& oSum)
 {
-    for (int dx = oColumns.nFirst; dx <= oColumns.nLast; ++dx)
+    for (int dx = oColumns.mnFirst; dx <= oColumns.mnLast; ++dx)
     {
         oSum = hn::Add(oSum, oPixels.Sample(dy, dx));
     }
@@ -103,31 +103,31 @@ HWY_INLINE void AddRow(const Neighbours& oPixels, int dy, Columns oColumns, Floa
 /// Mean and variation coefficient of a window.
 struct Variation
 {
-    Vector oMean;
-    Vector oCv;
+    Vector moMean;
+    Vector moCv;
 };
 
 struct Moments
 {
     // A constructor that the compiler writes itself would not be compiled for the target.
-    HWY_INLINE Moments() : oSum(hn::Zero(kFloatTag)), oSquares(hn::Zero(kFloatTag)) {}
+    HWY_INLINE Moments() : moSum(hn::Zero(kFloatTag)), moSquares(hn::Zero(kFloatTag)) {}
 
-    FloatVector oSum;
-    FloatVector oSquares;
+    FloatVector moSum;
+    FloatVector moSquares;
 
     HWY_INLINE void AddRow(const Neighbours& oPixels, int dy, Columns oColumns)
     {
-        for (int dx = oColumns.nFirst; dx <= oColumns.nLast; ++dx)
+        for (int dx = oColumns.mnFirst; dx <= oColumns.mnLast; ++dx)
         {
-            oSum = hn::Add(oSum, oPixels.Sample(dy, dx));
-            oSquares = hn::Add(oSquares, oPixels.Square(dy, dx));
+            moSum = hn::Add(moSum, oPixels.Sample(dy, dx));
+            moSquares = hn::Add(moSquares, oPixels.Square(dy, dx));
         }
     }
 
     HWY_INLINE Variation GetVariation(double dfCount) const
     {
-        const Vector oMean = Mean(oSum, dfCount);
-        const Vector oVariance = hn::Sub(Mean(oSquares, dfCount), hn::Mul(oMean, oMean));
+        const Vector oMean = Mean(moSum, dfCount);
+        const Vector oVariance = hn::Sub(Mean(moSquares, dfCount), hn::Mul(oMean, oMean));
         const Vector oCv = hn::Div(hn::Sqrt(oVariance), oMean);
         return {oMean, hn::IfThenZeroElse(hn::Eq(oMean, hn::Zero(kTag)), oCv)};
     }
@@ -178,33 +178,33 @@ Variation HalfWindowVariation(const Neighbours& oPixels, int nSize, int nDirecti
 struct Detection
 {
     HWY_INLINE Detection()
-        : oBest(Constant(1.0)),
-          oWorst(hn::Zero(kTag)),
-          oDirection(hn::Zero(kTag)),
-          oFirstMean(hn::Zero(kTag)),
-          oSecondMean(hn::Zero(kTag))
+        : moBest(Constant(1.0)),
+          moWorst(hn::Zero(kTag)),
+          moDirection(hn::Zero(kTag)),
+          moFirstMean(hn::Zero(kTag)),
+          moSecondMean(hn::Zero(kTag))
     {
     }
 
-    Vector oBest;
-    Vector oWorst;
-    Vector oDirection;
-    Vector oFirstMean;   ///< of the line, or of the first side of an edge
-    Vector oSecondMean;  ///< of the second side
+    Vector moBest;
+    Vector moWorst;
+    Vector moDirection;
+    Vector moFirstMean;   ///< of the line, or of the first side of an edge
+    Vector moSecondMean;  ///< of the second side
 
     HWY_INLINE void Take(int nDirection, Vector oRatio, Vector oFirst, Vector oSecond)
     {
         // A tie goes to the later direction.
-        const auto oBetter = hn::Le(oRatio, oBest);
-        oBest = hn::IfThenElse(oBetter, oRatio, oBest);
-        oDirection = hn::IfThenElse(oBetter, Constant(nDirection), oDirection);
-        oFirstMean = hn::IfThenElse(oBetter, oFirst, oFirstMean);
-        oSecondMean = hn::IfThenElse(oBetter, oSecond, oSecondMean);
-        oWorst = hn::IfThenElse(hn::Le(oWorst, oRatio), oRatio, oWorst);
+        const auto oBetter = hn::Le(oRatio, moBest);
+        moBest = hn::IfThenElse(oBetter, oRatio, moBest);
+        moDirection = hn::IfThenElse(oBetter, Constant(nDirection), moDirection);
+        moFirstMean = hn::IfThenElse(oBetter, oFirst, moFirstMean);
+        moSecondMean = hn::IfThenElse(oBetter, oSecond, moSecondMean);
+        moWorst = hn::IfThenElse(hn::Le(moWorst, oRatio), oRatio, moWorst);
     }
 
-    HWY_INLINE Vector GetSpread() const { return hn::Sub(oWorst, oBest); }
-    HWY_INLINE Lanes Has(int nDirection) const { return hn::Eq(oDirection, Constant(nDirection)); }
+    HWY_INLINE Vector GetSpread() const { return hn::Sub(moWorst, moBest); }
+    HWY_INLINE Lanes Has(int nDirection) const { return hn::Eq(moDirection, Constant(nDirection)); }
 };
 
 /// At most 1: the reciprocal of what is above.
@@ -232,29 +232,29 @@ HWY_INLINE void AddBesideLine(const Neighbours& oPixels, int dy, int nLine, int 
 
 struct LineSums
 {
-    FloatVector aoLine[4] = {hn::Zero(kFloatTag), hn::Zero(kFloatTag), hn::Zero(kFloatTag),
-                             hn::Zero(kFloatTag)};
+    FloatVector maoLine[4] = {hn::Zero(kFloatTag), hn::Zero(kFloatTag), hn::Zero(kFloatTag),
+                              hn::Zero(kFloatTag)};
     /// Five lines wide, the line itself included, for rows and columns.
-    FloatVector aoBand[2] = {hn::Zero(kFloatTag), hn::Zero(kFloatTag)};
+    FloatVector maoBand[2] = {hn::Zero(kFloatTag), hn::Zero(kFloatTag)};
     /// Without the line itself, for the diagonals.
-    FloatVector aoBeside[2] = {hn::Zero(kFloatTag), hn::Zero(kFloatTag)};
-    int anBeside[2] = {0, 0};
+    FloatVector maoBeside[2] = {hn::Zero(kFloatTag), hn::Zero(kFloatTag)};
+    int manBeside[2] = {0, 0};
 
     HWY_INLINE LineSums(const Neighbours& oPixels, int nHalf)
     {
         for (int dy = -2; dy <= 2; ++dy)
         {
-            AddRow(oPixels, dy, {-nHalf, nHalf}, aoBand[0]);
+            AddRow(oPixels, dy, {-nHalf, nHalf}, maoBand[0]);
         }
         for (int k = -nHalf; k <= nHalf; ++k)
         {
-            aoLine[0] = hn::Add(aoLine[0], oPixels.Sample(0, k));
-            aoLine[1] = hn::Add(aoLine[1], oPixels.Sample(k, 0));
-            aoLine[2] = hn::Add(aoLine[2], oPixels.Sample(k, k));
-            aoLine[3] = hn::Add(aoLine[3], oPixels.Sample(k, -k));
-            AddRow(oPixels, k, {-2, 2}, aoBand[1]);
-            AddBesideLine(oPixels, k, k, nHalf, aoBeside[0], anBeside[0]);
-            AddBesideLine(oPixels, k, -k, nHalf, aoBeside[1], anBeside[1]);
+            maoLine[0] = hn::Add(maoLine[0], oPixels.Sample(0, k));
+            maoLine[1] = hn::Add(maoLine[1], oPixels.Sample(k, 0));
+            maoLine[2] = hn::Add(maoLine[2], oPixels.Sample(k, k));
+            maoLine[3] = hn::Add(maoLine[3], oPixels.Sample(k, -k));
+            AddRow(oPixels, k, {-2, 2}, maoBand[1]);
+            AddBesideLine(oPixels, k, k, nHalf, maoBeside[0], manBeside[0]);
+            AddBesideLine(oPixels, k, -k, nHalf, maoBeside[1], manBeside[1]);
         }
     }
 
@@ -263,11 +263,11 @@ struct LineSums
     {
         if (nDirection <= COLUMN)
         {
-            const Vector oBand = hn::PromoteTo(kTag, aoBand[nDirection - 1]);
-            const Vector oLine = hn::PromoteTo(kTag, aoLine[nDirection - 1]);
+            const Vector oBand = hn::PromoteTo(kTag, maoBand[nDirection - 1]);
+            const Vector oLine = hn::PromoteTo(kTag, maoLine[nDirection - 1]);
             return hn::Div(hn::Sub(oBand, oLine), Constant(4.0 * nSize));
         }
-        return Mean(aoBeside[nDirection - DIAGONAL], anBeside[nDirection - DIAGONAL]);
+        return Mean(maoBeside[nDirection - DIAGONAL], manBeside[nDirection - DIAGONAL]);
     }
 };
 
@@ -277,7 +277,7 @@ Detection DetectLine(const Neighbours& oPixels, int nSize)
     Detection oDetection;
     for (int nDirection = ROW; nDirection <= ANTIDIAGONAL; ++nDirection)
     {
-        const Vector oLine = Mean(oSums.aoLine[nDirection - 1], nSize);
+        const Vector oLine = Mean(oSums.maoLine[nDirection - 1], nSize);
         const Vector oBeside = oSums.NeighbourMean(nDirection, nSize);
         const Vector oRatio = AtMostOne(hn::Div(oLine, oBeside));
         const auto oNone = hn::Eq(oBeside, hn::Zero(kTag));
@@ -289,10 +289,10 @@ Detection DetectLine(const Neighbours& oPixels, int nSize)
 /// The sums of the halves of a window on either side of a line through its centre.
 struct EdgeSums
 {
-    FloatVector aoFirst[4] = {hn::Zero(kFloatTag), hn::Zero(kFloatTag), hn::Zero(kFloatTag),
-                              hn::Zero(kFloatTag)};
-    FloatVector aoSecond[4] = {hn::Zero(kFloatTag), hn::Zero(kFloatTag), hn::Zero(kFloatTag),
+    FloatVector maoFirst[4] = {hn::Zero(kFloatTag), hn::Zero(kFloatTag), hn::Zero(kFloatTag),
                                hn::Zero(kFloatTag)};
+    FloatVector maoSecond[4] = {hn::Zero(kFloatTag), hn::Zero(kFloatTag), hn::Zero(kFloatTag),
+                                hn::Zero(kFloatTag)};
 
     HWY_INLINE EdgeSums(const Neighbours& oPixels, int nHalf)
     {
@@ -301,8 +301,8 @@ struct EdgeSums
         {
             for (int dx = -nHalf; dx <= nHalf; ++dx)
             {
-                aoFirst[0] = hn::Add(aoFirst[0], oPixels.Sample(k - nHalf - 1, dx));
-                aoSecond[0] = hn::Add(aoSecond[0], oPixels.Sample(k, dx));
+                maoFirst[0] = hn::Add(maoFirst[0], oPixels.Sample(k - nHalf - 1, dx));
+                maoSecond[0] = hn::Add(maoSecond[0], oPixels.Sample(k, dx));
             }
         }
         for (int dy = -nHalf; dy <= nHalf; ++dy)
@@ -317,8 +317,8 @@ private:
     HWY_INLINE void AddHalves(const Neighbours& oPixels, int dy, Columns oFirst, Columns oSecond,
                               int nDirection)
     {
-        AddRow(oPixels, dy, oFirst, aoFirst[nDirection - 1]);
-        AddRow(oPixels, dy, oSecond, aoSecond[nDirection - 1]);
+        AddRow(oPixels, dy, oFirst, maoFirst[nDirection - 1]);
+        AddRow(oPixels, dy, oSecond, maoSecond[nDirection - 1]);
     }
 };
 
@@ -329,8 +329,8 @@ Detection DetectEdge(const Neighbours& oPixels, int nSize)
     Detection oDetection;
     for (int nDirection = ROW; nDirection <= ANTIDIAGONAL; ++nDirection)
     {
-        const FloatVector oFirst = oSums.aoFirst[nDirection - 1];
-        const FloatVector oSecond = oSums.aoSecond[nDirection - 1];
+        const FloatVector oFirst = oSums.maoFirst[nDirection - 1];
+        const FloatVector oSecond = oSums.maoSecond[nDirection - 1];
         const Vector oRatio =
             AtMostOne(hn::Div(hn::PromoteTo(kTag, oFirst), hn::PromoteTo(kTag, oSecond)));
         const double dfCount = static_cast<double>(nSize) * nHalf;
@@ -384,17 +384,17 @@ Vector LineEstimate(const Neighbours& oPixels, int nSize, const Detection& oLine
         oFirst = hn::IfThenElse(oHere, oParallelMean(nShift), oFirst);
         oSecond = hn::IfThenElse(oHere, oParallelMean(-nShift), oSecond);
     }
-    const Vector oToFirst = hn::Abs(hn::Sub(oLine.oFirstMean, oFirst));
-    const Vector oToSecond = hn::Abs(hn::Sub(oLine.oFirstMean, oSecond));
+    const Vector oToFirst = hn::Abs(hn::Sub(oLine.moFirstMean, oFirst));
+    const Vector oToSecond = hn::Abs(hn::Sub(oLine.moFirstMean, oSecond));
     const Vector oChosen = hn::IfThenElse(hn::Le(oToFirst, oToSecond), oFirst, oSecond);
-    return hn::Mul(hn::Add(oChosen, oLine.oFirstMean), Constant(0.5));
+    return hn::Mul(hn::Add(oChosen, oLine.moFirstMean), Constant(0.5));
 }
 
 /// The lanes that go on with a detector at the next size: no smaller spread, the same direction.
 HWY_INLINE Lanes StillGrowing(Lanes oLanes, const Detection& oLast, const Detection& oNext)
 {
     const auto oSmaller = hn::Lt(oNext.GetSpread(), oLast.GetSpread());
-    return hn::AndNot(oSmaller, hn::And(oLanes, hn::Eq(oNext.oDirection, oLast.oDirection)));
+    return hn::AndNot(oSmaller, hn::And(oLanes, hn::Eq(oNext.moDirection, oLast.moDirection)));
 }
 
 Vector GrownLine(const Neighbours& oPixels, Detection oLine, Lanes oLanes)
@@ -436,8 +436,8 @@ Lanes IsSecondSide(const Neighbours& oPixels, int nSize, int nDirection, const D
         AddRow(oPixels, dy, oColumns, oSum);
     }
     const Vector oBand = Mean(oSum, nDirection <= COLUMN ? 3.0 * nSize : 3.0 * nSize - 2.0);
-    return hn::Lt(hn::Abs(hn::Sub(oBand, oEdge.oSecondMean)),
-                  hn::Abs(hn::Sub(oBand, oEdge.oFirstMean)));
+    return hn::Lt(hn::Abs(hn::Sub(oBand, oEdge.moSecondMean)),
+                  hn::Abs(hn::Sub(oBand, oEdge.moFirstMean)));
 }
 
 /// Sets the variation of the half window on the centre's side of the edge, for the lanes of oLanes.
@@ -446,8 +446,8 @@ void TakeSideOfEdge(const Neighbours& oPixels, int nSize, const Detection& oEdge
 {
     // No direction has no pixels.
     const Lanes oNone = hn::And(oLanes, oEdge.Has(0));
-    oResult.oMean = hn::IfThenZeroElse(oNone, oResult.oMean);
-    oResult.oCv = hn::IfThenZeroElse(oNone, oResult.oCv);
+    oResult.moMean = hn::IfThenZeroElse(oNone, oResult.moMean);
+    oResult.moCv = hn::IfThenZeroElse(oNone, oResult.moCv);
     for (int nDirection = ROW; nDirection <= ANTIDIAGONAL; ++nDirection)
     {
         const Lanes oHere = hn::And(oLanes, oEdge.Has(nDirection));
@@ -462,8 +462,8 @@ void TakeSideOfEdge(const Neighbours& oPixels, int nSize, const Detection& oEdge
             if (IsAny(oSide))
             {
                 const Variation oHalf = HalfWindowVariation(oPixels, nSize, nDirection, nSide);
-                oResult.oMean = hn::IfThenElse(oSide, oHalf.oMean, oResult.oMean);
-                oResult.oCv = hn::IfThenElse(oSide, oHalf.oCv, oResult.oCv);
+                oResult.moMean = hn::IfThenElse(oSide, oHalf.moMean, oResult.moMean);
+                oResult.moCv = hn::IfThenElse(oSide, oHalf.moCv, oResult.moCv);
             }
         }
     }
@@ -495,7 +495,7 @@ void TakeGrownEdge(const Neighbours& oPixels, Detection oEdge, Lanes oLanes, Var
 Variation GrownWindow(const Neighbours& oPixels, const TouziThresholds& oThresholds,
                       const Variation& oFive, const Detection& oEdgeOfFive, Lanes oLanes)
 {
-    const int nFirstSize = oThresholds.nStartSize + 2;
+    const int nFirstSize = oThresholds.mnStartSize + 2;
     Variation oResult = nFirstSize == 5 ? oFive : WindowVariation(oPixels, nFirstSize);
     Vector oLast = oEdgeOfFive.GetSpread();
     for (int nSize = nFirstSize + 2; nSize <= 2 * oPixels.GetMargin() + 1; nSize += 2)
@@ -507,10 +507,10 @@ Variation GrownWindow(const Neighbours& oPixels, const TouziThresholds& oThresho
             break;
         }
         const Variation oNext = WindowVariation(oPixels, nSize);
-        const Vector oChange = hn::Abs(hn::Sub(oNext.oCv, oResult.oCv));
-        oLanes = hn::And(oLanes, hn::Gt(Constant(oThresholds.dfGradiant), oChange));
-        oResult.oMean = hn::IfThenElse(oLanes, oNext.oMean, oResult.oMean);
-        oResult.oCv = hn::IfThenElse(oLanes, oNext.oCv, oResult.oCv);
+        const Vector oChange = hn::Abs(hn::Sub(oNext.moCv, oResult.moCv));
+        oLanes = hn::And(oLanes, hn::Gt(Constant(oThresholds.mdfGradiant), oChange));
+        oResult.moMean = hn::IfThenElse(oLanes, oNext.moMean, oResult.moMean);
+        oResult.moCv = hn::IfThenElse(oLanes, oNext.moCv, oResult.moCv);
         oLast = hn::IfThenElse(oLanes, oSpread, oLast);
     }
     return oResult;
@@ -521,15 +521,15 @@ Lanes TakeFlatArea(const Neighbours& oPixels, const TouziThresholds& oThresholds
                    const Variation& oFive, Lanes oLanes, Vector& oResult)
 {
     Lanes oFlat = NoLanes();
-    for (int nSize = oThresholds.nStartSize; nSize <= 2 * oPixels.GetMargin() + 1; nSize += 2)
+    for (int nSize = oThresholds.mnStartSize; nSize <= 2 * oPixels.GetMargin() + 1; nSize += 2)
     {
         const Variation oNext = nSize == 5 ? oFive : WindowVariation(oPixels, nSize);
-        oLanes = hn::And(oLanes, hn::Ge(Constant(oThresholds.dfCu), oNext.oCv));
+        oLanes = hn::And(oLanes, hn::Ge(Constant(oThresholds.mdfCu), oNext.moCv));
         if (!IsAny(oLanes))
         {
             break;
         }
-        oResult = hn::IfThenElse(oLanes, oNext.oMean, oResult);
+        oResult = hn::IfThenElse(oLanes, oNext.moMean, oResult);
         oFlat = hn::Or(oFlat, oLanes);
     }
     return oFlat;
@@ -539,10 +539,11 @@ Lanes TakeFlatArea(const Neighbours& oPixels, const TouziThresholds& oThresholds
 HWY_INLINE Vector Blend(double dfCu, const Variation& oVariation, Vector oCentre)
 {
     const Vector oOne = Constant(1.0);
-    const Vector oCv = oVariation.oCv;
+    const Vector oCv = oVariation.moCv;
     const Vector k = hn::Sub(oOne, hn::Div(Constant(dfCu * dfCu), hn::Mul(oCv, oCv)));
-    const Vector oBlend = hn::Add(hn::Mul(hn::Sub(oOne, k), oVariation.oMean), hn::Mul(k, oCentre));
-    return hn::IfThenElse(hn::Ge(Constant(dfCu), oCv), oVariation.oMean, oBlend);
+    const Vector oBlend =
+        hn::Add(hn::Mul(hn::Sub(oOne, k), oVariation.moMean), hn::Mul(k, oCentre));
+    return hn::IfThenElse(hn::Ge(Constant(dfCu), oCv), oVariation.moMean, oBlend);
 }
 
 /// The results of the lanes of oWanted, and which of them are strong scatterers.
@@ -550,15 +551,15 @@ Vector FilterPixels(const Neighbours& oPixels, const TouziThresholds& oThreshold
                     Lanes oWanted, Lanes& oScatterers)
 {
     const Variation oFive = WindowVariation(oPixels, 5);
-    oScatterers = hn::And(oWanted, hn::Ge(oFive.oCv, Constant(oThresholds.dfCmax)));
-    Vector oResult = Blend(oThresholds.dfCu, oFive, oCentre);
+    oScatterers = hn::And(oWanted, hn::Ge(oFive.moCv, Constant(oThresholds.mdfCmax)));
+    Vector oResult = Blend(oThresholds.mdfCu, oFive, oCentre);
     Lanes oOpen = hn::AndNot(oScatterers, oWanted);
-    const Vector oContour = Constant(oThresholds.dfContour);
+    const Vector oContour = Constant(oThresholds.mdfContour);
     if (IsAny(oOpen))
     {
         const Detection oLine = DetectLine(oPixels, 5);
-        const Lanes oVaries = hn::Gt(oFive.oCv, Constant(oThresholds.dfCuLine));
-        const Lanes oLines = hn::And(oOpen, hn::And(hn::Ge(oContour, oLine.oBest), oVaries));
+        const Lanes oVaries = hn::Gt(oFive.moCv, Constant(oThresholds.mdfCuLine));
+        const Lanes oLines = hn::And(oOpen, hn::And(hn::Ge(oContour, oLine.moBest), oVaries));
         if (IsAny(oLines))
         {
             oResult = hn::IfThenElse(oLines, GrownLine(oPixels, oLine, oLines), oResult);
@@ -569,7 +570,7 @@ Vector FilterPixels(const Neighbours& oPixels, const TouziThresholds& oThreshold
     if (IsAny(oOpen))
     {
         const Detection oEdge = DetectEdge(oPixels, 5);
-        const Lanes oEdges = hn::And(oOpen, hn::Ge(oContour, oEdge.oBest));
+        const Lanes oEdges = hn::And(oOpen, hn::Ge(oContour, oEdge.moBest));
         const Lanes oNeutral = hn::AndNot(oEdges, oOpen);
         Variation oVariation = oFive;
         if (IsAny(oNeutral))
@@ -577,7 +578,7 @@ Vector FilterPixels(const Neighbours& oPixels, const TouziThresholds& oThreshold
             oVariation = GrownWindow(oPixels, oThresholds, oFive, oEdge, oNeutral);
         }
         TakeGrownEdge(oPixels, oEdge, oEdges, oVariation);
-        oResult = hn::IfThenElse(oOpen, Blend(oThresholds.dfCu, oVariation, oCentre), oResult);
+        oResult = hn::IfThenElse(oOpen, Blend(oThresholds.mdfCu, oVariation, oCentre), oResult);
     }
     return hn::IfThenElseZero(oWanted, oResult);
 }
@@ -597,7 +598,7 @@ void FilterTouziRow(const TouziRows& oRows, const TouziThresholds& oThresholds,
         }
         Lanes oScatterers = NoLanes();
         hn::StoreU(FilterPixels(Neighbours(oRows, oThresholds, i), oThresholds,
-                                hn::LoadU(kTag, oRows.pCentres + i), oLanes, oScatterers),
+                                hn::LoadU(kTag, oRows.mpCentres + i), oLanes, oScatterers),
                    kTag, &oResults[i]);
         if (IsAny(oScatterers))
         {

@@ -44,6 +44,12 @@ std::unique_ptr<tessel::Raster> Drawn(const std::vector<At>& voChannels, int nMa
     return poRaster;
 }
 
+/// A mask for one such pixel, which it clears.
+std::unique_ptr<tessel::Mask> MaskedPixel()
+{
+    return MaskOf(Image<int>(11, std::vector<int>(121, 0)), Margins{5, 5});
+}
+
 template <class TOut = double>
 std::vector<TOut> Filtered(const FilterTouzi& oFilter, tessel::Raster& oIn,
                            tessel::Mask* poMask = nullptr)
@@ -273,7 +279,7 @@ TEST(FilterTouzi, DecibelComesOutDoubled)
 
 TEST(FilterTouzi, MaskedPixelIsZeroOrKeptByWayOfTheAmplitude)
 {
-    const auto poMask = MaskOf({{0}}, Margins{0, 0});
+    const auto poMask = MaskedPixel();
     const auto poIn = Drawn({[](int, int) { return 20.0; }, [](int, int) { return 30.0; }});
     for (const int nAmplit : {0, 1, 2})
     {
@@ -298,7 +304,9 @@ TEST(FilterTouzi, MaskedPixelsStillCountInTheWindowsOfOthers)
 {
     const auto poIn = RasterOf(Image<double>(13, std::vector<double>(143, 4.0)), Margins{5, 5});
     *poIn->GetPixelAs<double>(1, 0) = 5.0;
-    const auto poMask = MaskOf({{1, 0, 1}});
+    std::vector<int> vnValid(143, 1);
+    vnValid[5 * 13 + 6] = 0;
+    const auto poMask = MaskOf(Image<int>(13, vnValid), Margins{5, 5});
     EXPECT_EQ(Filtered(FilterTouzi(), *poIn, poMask.get()),
               (std::vector<double>{485.0 / 121.0, 5.0, 485.0 / 121.0}));
 }
@@ -307,7 +315,7 @@ template <class TOut>
 TOut Stored(double x)
 {
     const auto poIn = Drawn({[&](int, int) { return x; }});
-    const auto poMask = MaskOf({{0}});
+    const auto poMask = MaskedPixel();
     return Filtered<TOut>(FilterTouzi(), *poIn, poMask.get())[0];
 }
 
@@ -403,7 +411,7 @@ TEST(FilterTouzi, SettersCountOnlyUntilTheFirstBlockOfTheSameTypes)
 {
     FilterTouzi oFilter;
     const auto poIn = Drawn({[](int, int) { return 20.0; }});
-    const auto poMask = MaskOf({{0}});
+    const auto poMask = MaskedPixel();
     EXPECT_EQ(Filtered(oFilter, *poIn, poMask.get())[0], 20.0);
     oFilter.SetBGZero(true);
     oFilter.SetAmplit(2);

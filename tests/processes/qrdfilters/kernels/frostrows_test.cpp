@@ -135,7 +135,7 @@ TEST_P(FrostRows, MeansAreThoseOfTheDefinition)
             WeightedWindows oWindows{vpRows, {}, kColumns, kStep, vnWeightOf, vdfWeights.data()};
             if (bMasked)
             {
-                oWindows.oValid = vpBits;
+                oWindows.moValid = vpBits;
             }
             const std::vector<double> vdfFixed = RandomRow(nSamples);
             const std::vector<double> vdfWeighted = RandomCounts(nSamples);
