@@ -1,154 +1,52 @@
-// Makes the pictures and tables of the pages in docs/ from the library itself:
-//
-//     gallery radar FILE CHANNEL FOLDER    speckle on a crop of a file: pictures to FOLDER, tables
-//                                          of how the radar filters do on it and on a made scene
-//     gallery spatial FILE CHANNEL FOLDER  pictures of the spatial filters on a crop of a file
-//     gallery measure FILE CHANNEL LOOKS   the radar table for an image as it is, of intensities
-//
-// Tables go to standard output as Markdown. docs/make puts all in its place.
+// Makes the pictures and tables of the pages in docs/ from the library itself; docs/make puts all
+// in its place. Tables go to standard output as Markdown.
 
-#include <cmath>
-#include <cstdio>
 #include <filesystem>
+#include <functional>
 #include <iostream>
+#include <map>
 #include <string>
 #include <vector>
 
-#include "docs/gallery/greyimage.h"
-#include "docs/gallery/quality.h"
-#include "docs/gallery/speckle.h"
+#include "docs/gallery/pages.h"
 #include "platform/datasources/gdal/gdaldriver.h"
 
 namespace
 {
 
-using namespace kor::gallery;
+constexpr const char* kUsage =
+    "gallery radar FILE CHANNEL FOLDER    speckle on a crop of a file: pictures to FOLDER, tables\n"
+    "                                     of how the radar filters do on it and on a made scene\n"
+    "gallery measure FILE CHANNEL LOOKS   the radar table for an image as it is, of intensities\n";
 
-constexpr std::uint64_t kSeed = 20240229;
-constexpr std::uint32_t kSide = 180;  ///< of the crops that are shown
-constexpr std::uint32_t kZoom = 1;
+using Words = std::vector<std::string>;
 
-struct Candidate
+unsigned int ChannelOf(const std::string& oWord)
 {
-    std::string moFilter;
-    std::vector<std::string> mvoWords;
+    return static_cast<unsigned int>(std::stoul(oWord));
+}
+
+std::filesystem::path Folder(const std::string& oPath)
+{
+    std::filesystem::create_directories(oPath);
+    return oPath;
+}
+
+struct Job
+{
+    std::size_t mnWords;
+    std::function<void(const Words&)> mfnRun;
 };
 
-/// The filters that smooth speckle, for intensities of so many looks.
-std::vector<Candidate> SpeckleFilters(int nLooks)
+const std::map<std::string, Job>& Jobs()
 {
-    const std::string oLooks = "looks=" + std::to_string(nLooks);
-    return {
-        {"average", {}},
-        {"median", {}},
-        {"frost", {"damping=1"}},
-        {"enhanced_frost", {oLooks, "damping=1"}},
-        {"lee", {oLooks}},
-        {"enhanced_lee", {oLooks, "damping=1"}},
-        {"kuan", {oLooks}},
-        {"gamma", {oLooks}},
-        {"touzi", {oLooks, "values=intensity"}},
+    using namespace kor::gallery;
+    static const std::map<std::string, Job> oJobs = {
+        {"radar", {3, [](const Words& o) { MakeRadarPage(o[0], ChannelOf(o[1]), Folder(o[2])); }}},
+        {"measure",
+         {3, [](const Words& o) { MeasureRadarImage(o[0], ChannelOf(o[1]), std::stoi(o[2])); }}},
     };
-}
-
-void PrintSceneTable()
-{
-    const GreyImage oTruth = SyntheticScene();
-    std::printf(
-        "| filter | PSNR 1 look | ENL | mean | PSNR 4 looks | ENL | mean | PSNR 10 looks | ENL | "
-        "mean |\n|---|---|---|---|---|---|---|---|---|---|\n");
-    const int anLooks[] = {1, 4, 10};
-    const auto oPrint = [&](const std::string& oName, const auto& oMake)
-    {
-        std::printf("| %s |", oName.c_str());
-        for (const int nLooks : anLooks)
-        {
-            const GreyImage oImage = oMake(Speckled(oTruth, nLooks, kSeed), nLooks);
-            std::printf(" %.2f | %.1f | %.3f |", PeakSignalToNoise(oImage, oTruth),
-                        EquivalentLooks(oImage, UniformField()), MeanRatio(oImage, oTruth));
-        }
-        std::printf("\n");
-    };
-    oPrint("none", [](const GreyImage& oImage, int) { return oImage; });
-    for (std::size_t i = 0; i < SpeckleFilters(1).size(); ++i)
-    {
-        oPrint(SpeckleFilters(1)[i].moFilter,
-               [&](const GreyImage& oImage, int nLooks)
-               {
-                   const Candidate oFilter = SpeckleFilters(nLooks)[i];
-                   return Filtered(oImage, oFilter.moFilter, oFilter.mvoWords);
-               });
-    }
-}
-
-/// The place where the image is most uniform: the greatest number of looks of all squares of nSide
-/// pixels, on a grid.
-Area MostUniform(const GreyImage& oImage, std::uint32_t nSide)
-{
-    Area oBest{0, 0, nSide, nSide};
-    double dfMost = 0.0;
-    for (std::uint32_t y = 0; y + nSide <= oImage.mnHeight; y += nSide / 4)
-    {
-        for (std::uint32_t x = 0; x + nSide <= oImage.mnWidth; x += nSide / 4)
-        {
-            const Area oArea{x, y, nSide, nSide};
-            const double dfLooks = EquivalentLooks(oImage, oArea);
-            if (dfLooks > dfMost)
-            {
-                dfMost = dfLooks;
-                oBest = oArea;
-            }
-        }
-    }
-    return oBest;
-}
-
-void MakeRadarPage(const std::string& oFile, unsigned int nChannel,
-                   const std::filesystem::path& oFolder)
-{
-    constexpr int kLooks = 4;
-    const GreyImage oTruth = Crop(ReadChannel(oFile, nChannel), {20, 150, kSide, kSide});
-    const GreyImage oSpeckled = Speckled(oTruth, kLooks, kSeed);
-    const Scale oScale = ScaleOf(oTruth);
-    const Area oPatch = MostUniform(oTruth, 24);
-    std::printf("| filter | ENL | edges | mean |\n|---|---|---|---|\n");
-    const auto oShow = [&](const std::string& oName, const GreyImage& oImage)
-    {
-        WritePicture((oFolder / (oName + ".png")).string(), oImage, oScale, kZoom);
-        std::printf("| %s | %.1f | %.3f | %.3f |\n", oName.c_str(), EquivalentLooks(oImage, oPatch),
-                    EdgeCorrelation(oImage, oTruth), MeanRatio(oImage, oSpeckled));
-    };
-    oShow("truth", oTruth);
-    oShow("speckled", oSpeckled);
-    for (const Candidate& oFilter : SpeckleFilters(kLooks))
-    {
-        oShow(oFilter.moFilter, Filtered(oSpeckled, oFilter.moFilter, oFilter.mvoWords));
-    }
-    const GreyImage oTexture = Filtered(oSpeckled, "texture", {"measures=1"});
-    WritePicture((oFolder / "texture.png").string(), oTexture, ScaleOf(oTexture), kZoom);
-    std::printf("\n");
-    PrintSceneTable();
-}
-
-void MeasureImage(const std::string& oFile, unsigned int nChannel, int nLooks)
-{
-    const GreyImage oImage = ReadChannel(oFile, nChannel);
-    const Area oPatch = MostUniform(oImage, 32);
-    std::printf(
-        "uniform patch: 32 x 32 pixels at %u, %u\n\n| filter | ENL | gradients | mean |\n"
-        "|---|---|---|---|\n",
-        oPatch.x, oPatch.y);
-    const auto oPrint = [&](const std::string& oName, const GreyImage& oResult)
-    {
-        std::printf("| %s | %.1f | %.3f | %.3f |\n", oName.c_str(),
-                    EquivalentLooks(oResult, oPatch), GradientRatio(oResult, oImage),
-                    MeanRatio(oResult, oImage));
-    };
-    oPrint("none", oImage);
-    for (const Candidate& oFilter : SpeckleFilters(nLooks))
-    {
-        oPrint(oFilter.moFilter, Filtered(oImage, oFilter.moFilter, oFilter.mvoWords));
-    }
+    return oJobs;
 }
 
 }  // namespace
@@ -157,25 +55,16 @@ int main(int nArguments, char* apszArguments[])
 {
     try
     {
-        const std::string oJob = nArguments == 5 ? apszArguments[1] : "";
-        kor::datasources::RegisterGdalDriver();
-        if (oJob == "radar" || oJob == "measure")
+        const Words oWords(apszArguments + 1, apszArguments + nArguments);
+        const auto oJob = oWords.empty() ? Jobs().end() : Jobs().find(oWords[0]);
+        if (oJob == Jobs().end() || oWords.size() != 1 + oJob->second.mnWords)
         {
-            const std::string oFile = apszArguments[2];
-            const auto nChannel = static_cast<unsigned int>(std::stoul(apszArguments[3]));
-            if (oJob == "radar")
-            {
-                std::filesystem::create_directories(apszArguments[4]);
-                MakeRadarPage(oFile, nChannel, apszArguments[4]);
-            }
-            else
-            {
-                MeasureImage(oFile, nChannel, std::stoi(apszArguments[4]));
-            }
-            return 0;
+            std::cerr << kUsage;
+            return 2;
         }
-        std::cerr << "Usage: gallery radar FILE CHANNEL FOLDER | measure FILE CHANNEL LOOKS\n";
-        return 2;
+        kor::datasources::RegisterGdalDriver();
+        oJob->second.mfnRun({oWords.begin() + 1, oWords.end()});
+        return 0;
     }
     catch (const std::exception& oError)
     {

@@ -1,0 +1,16 @@
+#pragma once
+
+#include <filesystem>
+#include <string>
+
+namespace kor::gallery
+{
+
+/// Speckle on a crop of a channel: pictures of the radar filters to oFolder; tables of how they do
+/// on it and on a made scene.
+void MakeRadarPage(const std::string& oFile, unsigned int nChannel,
+                   const std::filesystem::path& oFolder);
+/// The table of the radar filters for a channel of intensities as it is, of so many looks.
+void MeasureRadarImage(const std::string& oFile, unsigned int nChannel, int nLooks);
+
+}  // namespace kor::gallery
