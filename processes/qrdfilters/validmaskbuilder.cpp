@@ -2,7 +2,11 @@
 
 #include <algorithm>
 #include <cmath>
+#include <cstdint>
+#include <functional>
 #include <limits>
+#include <numeric>
+#include <span>
 #include <type_traits>
 #include <utility>
 
@@ -41,37 +45,63 @@ std::vector<TSample> SamplesOf(const std::vector<double>& vdfNoData)
     return vSamples;
 }
 
+/// 1 for a sample that is finite and no nodata value, else 0. The loops are plain so that compilers
+/// make vectors of them.
 template <class TSample>
-bool IsValid(TSample xSample, const std::vector<TSample>& vNoData)
+void MarkValidSamples(const TSample* __restrict pSamples, const std::vector<TSample>& vNoData,
+                      std::span<unsigned char> oValid)
 {
-    if constexpr (std::is_floating_point_v<TSample>)
+    unsigned char* __restrict pValid = oValid.data();
+    for (std::size_t i = 0; i < oValid.size(); ++i)
     {
-        if (!std::isfinite(xSample))
+        if constexpr (std::is_floating_point_v<TSample>)
         {
-            return false;
+            pValid[i] = std::abs(pSamples[i]) <= std::numeric_limits<TSample>::max();
+        }
+        else
+        {
+            pValid[i] = 1;
         }
     }
-    return std::find(vNoData.begin(), vNoData.end(), xSample) == vNoData.end();
+    for (const TSample xNoData : vNoData)
+    {
+        for (std::size_t i = 0; i < oValid.size(); ++i)
+        {
+            pValid[i] &= static_cast<unsigned char>(pSamples[i] != xNoData);
+        }
+    }
 }
 
-/// One byte a pixel, margins included.
+/// One byte a pixel, margins included. A pixel is valid when all its samples are.
 template <class TSample>
 std::vector<unsigned char> FindValidPixels(const tessel::Raster& oRaster,
                                            const std::vector<double>& vdfNoData)
 {
+    constexpr std::size_t kPixelsAtOnce = 1024;
     const std::vector<TSample> vNoData = SamplesOf<TSample>(vdfNoData);
     const std::size_t nPixels = std::size_t{oRaster.mnTotalWidth} * oRaster.mnTotalHeight;
     const std::size_t nSamples =
         std::size_t{oRaster.mnChannels} * (oRaster.moDataType.mbComplex ? 2U : 1U);
-    const auto* pSample = reinterpret_cast<const TSample*>(oRaster.mpBuffer);
+    const auto* pSamples = reinterpret_cast<const TSample*>(oRaster.mpBuffer);
     std::vector<unsigned char> vValid(nPixels);
-    for (unsigned char& nByte : vValid)
+    std::vector<unsigned char> vSamples(std::min(kPixelsAtOnce, nPixels) * nSamples);
+    for (std::size_t nFirst = 0; nFirst < nPixels; nFirst += kPixelsAtOnce)
     {
-        nByte = std::all_of(pSample, pSample + nSamples,
-                            [&](TSample xSample) { return IsValid(xSample, vNoData); })
-                    ? 1
-                    : 0;
-        pSample += nSamples;
+        const std::span oPixels =
+            std::span(vValid).subspan(nFirst, std::min(kPixelsAtOnce, nPixels - nFirst));
+        if (nSamples == 1)
+        {
+            MarkValidSamples(pSamples + nFirst, vNoData, oPixels);
+            continue;
+        }
+        const std::span oSamples(vSamples.data(), oPixels.size() * nSamples);
+        MarkValidSamples(pSamples + nFirst * nSamples, vNoData, oSamples);
+        for (std::size_t i = 0; i < oPixels.size(); ++i)
+        {
+            const auto oPixel = oSamples.subspan(i * nSamples, nSamples);
+            oPixels[i] = std::accumulate(oPixel.begin(), oPixel.end(), std::uint8_t{1},
+                                         std::bit_and<std::uint8_t>());
+        }
     }
     return vValid;
 }

@@ -4,6 +4,8 @@
 
 #include <cmath>
 #include <limits>
+#include <random>
+#include <vector>
 
 #include "platform/exception/exception.h"
 #include "tests/support/blocks.h"
@@ -88,6 +90,26 @@ TEST(ValidMaskBuilder, MarginsAreMaskedToo)
 {
     const auto poBlock = test::RasterOf(Image<float>{{NAN, 1, 2, NAN}}, {1, 0});
     EXPECT_EQ(ValidPixels({}, *poBlock), (Flags{0, 1, 1, 0}));
+}
+
+TEST(ValidMaskBuilder, LongRowsOfAnyNumberOfChannelsAreThoseOfTheDefinition)
+{
+    constexpr std::uint32_t kPixels = 2500;
+    std::mt19937 oRandom(11);
+    for (const std::uint32_t nChannels : {1U, 2U, 3U, 17U})
+    {
+        std::vector<float> vfRow(std::size_t{kPixels} * nChannels);
+        std::vector<int> vnExpected(kPixels, 1);
+        for (std::size_t i = 0; i < vfRow.size(); ++i)
+        {
+            const float afDrawn[] = {-9999.0F, std::numeric_limits<float>::infinity(), NAN};
+            const std::uint32_t nDrawn = oRandom() % (40 * nChannels);
+            vfRow[i] = nDrawn < 3 ? afDrawn[nDrawn] : static_cast<float>(nDrawn);
+            vnExpected[i / nChannels] &= nDrawn < 3 ? 0 : 1;
+        }
+        EXPECT_EQ(Valid({5e5, -9999.0}, Image<float>(vfRow.size(), vfRow), nChannels), vnExpected)
+            << nChannels;
+    }
 }
 
 TEST(ValidMaskBuilder, BothPartsOfComplexSamplesAreLookedAt)
