@@ -68,6 +68,13 @@ const kernels::StencilRows& TileRows::Around(std::uint32_t nRow, std::uint32_t n
 
 void TileRows::Load(std::int64_t y)
 {
+    if (y + 2 < (int64_t)moBlock.moIn.mnHeight + moBlock.moIn.mnMarginY)
+    {
+        const unsigned char* p = moBlock.moIn.GetPixel(mnLeft, y + 2);
+        const unsigned char* e = moBlock.moIn.GetPixel(mnLeft + (int64_t)mnPixels, y + 2);
+        for (; p < e; p += 64)
+            __builtin_prefetch(p);
+    }
     const unsigned char* pValid = moBlock.mpoValid != nullptr ? ValidSamples(y) : nullptr;
     LoadSamplesOf(y, pValid);
     Mark(y, pValid);
