@@ -17,7 +17,8 @@ namespace
 constexpr const char* kUsage =
     "gallery radar FILE CHANNEL FOLDER    speckle on a crop of a file: pictures to FOLDER, tables\n"
     "                                     of how the radar filters do on it and on a made scene\n"
-    "gallery measure FILE CHANNEL LOOKS   the radar table for an image as it is, of intensities\n";
+    "gallery measure FILE CHANNEL LOOKS   the radar table for an image as it is, of intensities\n"
+    "gallery spatial FILE CHANNEL FOLDER  pictures of the spatial filters on a crop of a file\n";
 
 using Words = std::vector<std::string>;
 
@@ -43,6 +44,8 @@ const std::map<std::string, Job>& Jobs()
     using namespace kor::gallery;
     static const std::map<std::string, Job> oJobs = {
         {"radar", {3, [](const Words& o) { MakeRadarPage(o[0], ChannelOf(o[1]), Folder(o[2])); }}},
+        {"spatial",
+         {3, [](const Words& o) { MakeSpatialPage(o[0], ChannelOf(o[1]), Folder(o[2])); }}},
         {"measure",
          {3, [](const Words& o) { MeasureRadarImage(o[0], ChannelOf(o[1]), std::stoi(o[2])); }}},
     };

@@ -13,4 +13,8 @@ void MakeRadarPage(const std::string& oFile, unsigned int nChannel,
 /// The table of the radar filters for a channel of intensities as it is, of so many looks.
 void MeasureRadarImage(const std::string& oFile, unsigned int nChannel, int nLooks);
 
+/// Pictures of the spatial filters on a crop of a channel, to oFolder.
+void MakeSpatialPage(const std::string& oFile, unsigned int nChannel,
+                     const std::filesystem::path& oFolder);
+
 }  // namespace kor::gallery

@@ -9,10 +9,12 @@
 #include "processes/qrdfilters/filtercustom.h"
 #include "processes/qrdfilters/filteredge.h"
 #include "processes/qrdfilters/filtergauss.h"
+#include "processes/qrdfilters/filterlaplacian.h"
 #include "processes/qrdfilters/filtermedian.h"
 #include "processes/qrdfilters/filtermode.h"
 #include "processes/qrdfilters/filternoise.h"
 #include "processes/qrdfilters/filterprewitt.h"
+#include "processes/qrdfilters/filtersharp.h"
 #include "processes/qrdfilters/filtersobel.h"
 #include "processes/qrdfilters/filterstddeviation.h"
 
@@ -123,6 +125,23 @@ PreparedFilter MakeGradient(Arguments& oArguments, const RasterInfo& oIn)
     return oPrepared;
 }
 
+PreparedFilter MakeSharp(Arguments& oArguments, const RasterInfo& /*oIn*/)
+{
+    const Window oWindow = TakeWindow(oArguments, 3);
+    if (oWindow.mnHalfX == 0 && oWindow.mnHalfY == 0)
+    {
+        throw UsageError("window=1 cannot be used; sharp takes more than one pixel");
+    }
+    filters::FilterSharp oFilter;
+    oFilter.SetBGZero(TakeZeroBackground(oArguments));
+    return {FilterAlgorithm(oFilter, oWindow)};
+}
+
+PreparedFilter MakeLaplacian(Arguments& oArguments, const RasterInfo& /*oIn*/)
+{
+    return {FilterAlgorithm(filters::FilterLaplacian(), TakeWindow(oArguments, 3))};
+}
+
 PreparedFilter MakeDeviation(Arguments& oArguments, const RasterInfo& oIn)
 {
     PreparedFilter oPrepared = {
@@ -183,6 +202,12 @@ std::span<const FilterEntry> GetSpatialFilters()
          "factor=1          multiplier of the result\n"
          "background=input  masked pixels: input (kept) or zero\n",
          MakeGradient<filters::FilterPrewitt>},
+        {"sharp", "twice the pixel minus the mean of the window",
+         "window=3          pixels, odd, more than one; 7x5 is 7 wide and 5 high\n"
+         "background=input  masked pixels: input (kept) or zero\n",
+         MakeSharp},
+        {"laplacian", "the pixel minus the mean of the window, as 64R",
+         "window=3          pixels, odd; 7x5 is 7 wide and 5 high\n", MakeLaplacian},
         {"deviation", "standard deviation of the window",
          "window=7          pixels, odd; 7x5 is 7 wide and 5 high\n", MakeDeviation},
         {"noise", "mean of the window, and a mark where the pixel stands out from it",

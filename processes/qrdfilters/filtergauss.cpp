@@ -24,9 +24,6 @@ namespace
 
 constexpr const char* kSource = "processes/qrdfilters/filtergauss";
 
-// As many as let the rows of a usual window stay in the first caches.
-constexpr std::size_t kTileSamples = 512;
-
 bool IsDefined(double dfSigmasq)
 {
     return !(std::fabs(dfSigmasq) < std::numeric_limits<double>::epsilon());
@@ -214,7 +211,6 @@ void FilterGauss::ProcessBlock(tessel::Raster* poRasterIn, tessel::Mask* poMaskI
     stencil::SampleTypes oTypes = stencil::SampleTypesOf<double, double>(true);
     oTypes.mpfnBackground = mbBGZero ? nullptr : WriteRowSamples;
     stencil::StencilBlock oBlock(*poRasterIn, poMaskIn, *poRasterOut, poMaskOut, oWindow, oTypes);
-    oBlock.mnTileSamples = kTileSamples;
     oBlock.mnGroupRows = 1;
     kernels::GaussKernels oKernels{{madfKernel1.data(), nHalf + 1}, {}};
     if (mbTwoKernels)

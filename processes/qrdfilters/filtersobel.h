@@ -24,9 +24,8 @@ namespace kor::filters
 ///          when a margin is 0, before anything is written. In hardened builds kor::Exception for
 ///          samples of another type and for blocks whose geometries do not match.
 /// Threads  works on the calling thread; one object may serve many threads.
-/// Source   R. O. Duda, P. E. Hart, "Pattern Classification and Scene Analysis", Wiley, 1973,
-/// 271-272,
-///          after I. Sobel, G. Feldman, 1968.
+/// Source   R. O. Duda, P. E. Hart, "Pattern Classification and Scene Analysis", Wiley, 1973, pages
+///          271-272, after I. Sobel, G. Feldman, 1968.
 class FilterSobel
 {
 public:

@@ -84,6 +84,34 @@ TEST_F(FilterFile, SmoothsAroundNoDataAndLeavesItWhereItIs)
     EXPECT_EQ(moFolder.Names(), (std::set<std::string>{"average.tif", "grid.asc", "median.tif"}));
 }
 
+// Windows of three in a row, the edge continued and the hole left out: means 4/3, 2, 8/3; 4, 6;
+// 22/3, 35, 188/3.
+TEST_F(FilterFile, SharpensInTheTypeOfTheInput)
+{
+    const std::string oGrid = WriteGrid();
+    const ProgramRun oRun = Run(oGrid, "sharp.tif", "sharp window=3x1");
+    ASSERT_EQ(oRun.mnStatus, 0) << oRun.moComplaint;
+    EXPECT_EQ(Read<std::int32_t>("sharp.tif"),
+              (Image<std::int32_t>{{1, 2, 3}, {4, -9999, 6}, {7, -19, 117}}));
+    ASSERT_EQ(Run(oGrid, "zero.tif", "sharp window=3x1 background=zero").mnStatus, 0);
+    EXPECT_EQ(Read<std::int32_t>("zero.tif").Samples()[4], 0);
+    const ProgramRun oSmall = Run(oGrid, "small.tif", "sharp window=1");
+    EXPECT_EQ(oSmall.mnStatus, 2);
+    EXPECT_NE(oSmall.moComplaint.find("sharp takes more than one pixel"), std::string::npos)
+        << oSmall.moComplaint;
+}
+
+TEST_F(FilterFile, StoresTheLaplacianAsDoubles)
+{
+    const std::string oGrid = WriteGrid();
+    const ProgramRun oRun = Run(oGrid, "laplacian.tif", "laplacian window=3x1");
+    ASSERT_EQ(oRun.mnStatus, 0) << oRun.moComplaint;
+    EXPECT_EQ(Read<double>("laplacian.tif"),
+              (Image<double>{{1.0 - 4.0 / 3.0, 0, 3.0 - 8.0 / 3.0},
+                             {0, 0, 0},
+                             {7.0 - 22.0 / 3.0, -27, 90.0 - 188.0 / 3.0}}));
+}
+
 TEST_F(FilterFile, KeepsNoDataAndGeoreference)
 {
     ASSERT_EQ(Run(WriteGrid(), "out.tif", "median").mnStatus, 0);

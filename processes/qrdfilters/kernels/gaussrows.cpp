@@ -32,35 +32,55 @@ struct Weights
     const double* mapWeights[2];
 };
 
-/// Adds one pair after the other, and the middle at last: from +0.0 on, so that a first term of
-/// -0.0 gives +0.0. oPair(k) is the sum of the samples k before and behind the ends, oMiddle() the
-/// one in the middle.
-template <std::size_t kKernels, class D, class Pair, class Middle>
-HWY_INLINE void AddMirrored(D oTag, const Weights<kKernels>& oWeights, const Pair& oPair,
-                            const Middle& oMiddle, hn::Vec<D> (&aoSums)[kKernels])
+/// Sums of kVectors neighbouring vectors by kKernels kernels.
+template <class D, std::size_t kKernels, std::size_t kVectors>
+struct GaussSums
 {
+    hn::Vec<D> aoSums[kKernels][kVectors];
+};
+
+/// Adds one pair after the other, and the middle at last: from +0.0 on, so that a first term of
+/// -0.0 gives +0.0. oPair(n, k, v) is the sum of the samples k behind and before the ends,
+/// oMiddle(n, v) the one in the middle.
+template <std::size_t kVectors, std::size_t kKernels, class D, class Pair, class Middle>
+HWY_INLINE GaussSums<D, kKernels, kVectors> AddMirrored(D oTag, const Weights<kKernels>& oWeights,
+                                                        const Pair& oPair, const Middle& oMiddle)
+{
+    GaussSums<D, kKernels, kVectors> oSums;
     for (std::size_t n = 0; n < kKernels; ++n)
     {
-        aoSums[n] = hn::Zero(oTag);
+        for (std::size_t v = 0; v < kVectors; ++v)
+        {
+            oSums.aoSums[n][v] = hn::Zero(oTag);
+        }
     }
     for (std::size_t k = 0; k < oWeights.mnHalf; ++k)
     {
         for (std::size_t n = 0; n < kKernels; ++n)
         {
-            aoSums[n] = hn::Add(aoSums[n], hn::Mul(oPair(n, k), oWeights.Get(oTag, n, k)));
+            const auto oWeight = oWeights.Get(oTag, n, k);
+            for (std::size_t v = 0; v < kVectors; ++v)
+            {
+                oSums.aoSums[n][v] = hn::Add(oSums.aoSums[n][v], hn::Mul(oPair(n, k, v), oWeight));
+            }
         }
     }
     for (std::size_t n = 0; n < kKernels; ++n)
     {
         const auto oWeight = oWeights.Get(oTag, n, oWeights.mnHalf);
-        aoSums[n] = hn::Add(aoSums[n], hn::Mul(oWeight, oMiddle(n)));
+        for (std::size_t v = 0; v < kVectors; ++v)
+        {
+            oSums.aoSums[n][v] = hn::Add(oSums.aoSums[n][v], hn::Mul(oWeight, oMiddle(n, v)));
+        }
     }
+    return oSums;
 }
 
-template <std::size_t kKernels, class D>
-HWY_INLINE hn::Vec<D> Result(const hn::Vec<D> (&aoSums)[kKernels], D)
+template <class D, std::size_t kKernels, std::size_t kVectors>
+HWY_INLINE hn::Vec<D> Result(const GaussSums<D, kKernels, kVectors>& oSums, std::size_t v)
 {
-    return kKernels == 1 ? aoSums[0] : hn::Abs(hn::Sub(aoSums[0], aoSums[kKernels - 1]));
+    return kKernels == 1 ? oSums.aoSums[0][v]
+                         : hn::Abs(hn::Sub(oSums.aoSums[0][v], oSums.aoSums[kKernels - 1][v]));
 }
 
 template <std::size_t kKernels>
@@ -72,19 +92,20 @@ void SumColumns(const StencilRows& oRows, const Weights<kKernels>& oWeights,
     const double* const* apRows = oRows.moSamples.data();
     const auto oVectors = [&](auto oTag, auto kVectors, std::size_t i) HWY_ATTR
     {
-        for (std::size_t v = 0; v < kVectors(); ++v, i += hn::Lanes(oTag))
+        const std::size_t nLanes = hn::Lanes(oTag);
+        const auto oPair = [&](std::size_t, std::size_t k, std::size_t v) HWY_ATTR
         {
-            const auto oPair = [&](std::size_t, std::size_t k) HWY_ATTR {
-                return hn::Add(hn::LoadU(oTag, apRows[k] + i),
-                               hn::LoadU(oTag, apRows[nLast - k] + i));
-            };
-            const auto oMiddle = [&](std::size_t) HWY_ATTR
-            { return hn::LoadU(oTag, apRows[oWeights.mnHalf] + i); };
-            hn::Vec<decltype(oTag)> aoSums[kKernels];
-            AddMirrored(oTag, oWeights, oPair, oMiddle, aoSums);
-            for (std::size_t n = 0; n < kKernels; ++n)
+            return hn::Add(hn::LoadU(oTag, apRows[k] + i + v * nLanes),
+                           hn::LoadU(oTag, apRows[nLast - k] + i + v * nLanes));
+        };
+        const auto oMiddle = [&](std::size_t, std::size_t v) HWY_ATTR
+        { return hn::LoadU(oTag, apRows[oWeights.mnHalf] + i + v * nLanes); };
+        const auto oSums = AddMirrored<kVectors()>(oTag, oWeights, oPair, oMiddle);
+        for (std::size_t n = 0; n < kKernels; ++n)
+        {
+            for (std::size_t v = 0; v < kVectors(); ++v)
             {
-                hn::StoreU(aoSums[n], oTag, &adfColumns[n * nColumns + i]);
+                hn::StoreU(oSums.aoSums[n][v], oTag, &adfColumns[n * nColumns + i + v * nLanes]);
             }
         }
     };
@@ -100,19 +121,22 @@ void SumAcross(const StencilRows& oRows, const Weights<kKernels>& oWeights,
     const std::size_t nLast = 2 * oWeights.mnHalf * nStep;
     const auto oVectors = [&](auto oTag, auto kVectors, std::size_t i) HWY_ATTR
     {
-        for (std::size_t v = 0; v < kVectors(); ++v, i += hn::Lanes(oTag))
+        const std::size_t nLanes = hn::Lanes(oTag);
+        const auto oPair = [&](std::size_t n, std::size_t k, std::size_t v) HWY_ATTR
         {
-            const auto oPair = [&](std::size_t n, std::size_t k) HWY_ATTR
-            {
-                const double* pColumns = &adfColumns[n * nColumns + i];
-                return hn::Add(hn::LoadU(oTag, pColumns + k * nStep),
-                               hn::LoadU(oTag, pColumns + nLast - k * nStep));
-            };
-            const auto oMiddle = [&](std::size_t n) HWY_ATTR
-            { return hn::LoadU(oTag, &adfColumns[n * nColumns + i] + oWeights.mnHalf * nStep); };
-            hn::Vec<decltype(oTag)> aoSums[kKernels];
-            AddMirrored(oTag, oWeights, oPair, oMiddle, aoSums);
-            hn::StoreU(Result(aoSums, oTag), oTag, &oOut[i]);
+            const double* pColumns = &adfColumns[n * nColumns + i + v * nLanes];
+            return hn::Add(hn::LoadU(oTag, pColumns + k * nStep),
+                           hn::LoadU(oTag, pColumns + nLast - k * nStep));
+        };
+        const auto oMiddle = [&](std::size_t n, std::size_t v) HWY_ATTR
+        {
+            const double* pColumns = &adfColumns[n * nColumns + i + v * nLanes];
+            return hn::LoadU(oTag, pColumns + oWeights.mnHalf * nStep);
+        };
+        const auto oSums = AddMirrored<kVectors()>(oTag, oWeights, oPair, oMiddle);
+        for (std::size_t v = 0; v < kVectors(); ++v)
+        {
+            hn::StoreU(Result(oSums, v), oTag, &oOut[i + v * nLanes]);
         }
     };
     ForEachVector(oOut.size(), oVectors);
@@ -141,20 +165,21 @@ HWY_INLINE hn::Vec<D> SmoothWindow(D oTag, const MaskedWindow<D>& oWindow,
                                    const Weights<kKernels>& oWeights)
 {
     const std::size_t nHalf = oWeights.mnHalf;
-    hn::Vec<D> aoColumns[kLongestGaussKernel][kKernels];
+    GaussSums<D, kKernels, 1> aoColumns[kLongestGaussKernel];
     for (std::size_t x = 0; x <= 2 * nHalf; ++x)
     {
-        const auto oPair = [&](std::size_t, std::size_t k) HWY_ATTR
+        const auto oPair = [&](std::size_t, std::size_t k, std::size_t) HWY_ATTR
         { return hn::Add(oWindow.At(x, k), oWindow.At(x, 2 * nHalf - k)); };
-        const auto oMiddle = [&](std::size_t) HWY_ATTR { return oWindow.At(x, nHalf); };
-        AddMirrored(oTag, oWeights, oPair, oMiddle, aoColumns[x]);
+        const auto oMiddle = [&](std::size_t, std::size_t) HWY_ATTR
+        { return oWindow.At(x, nHalf); };
+        aoColumns[x] = AddMirrored<1>(oTag, oWeights, oPair, oMiddle);
     }
-    const auto oPair = [&](std::size_t n, std::size_t k) HWY_ATTR
-    { return hn::Add(aoColumns[k][n], aoColumns[2 * nHalf - k][n]); };
-    const auto oMiddle = [&](std::size_t n) HWY_ATTR { return aoColumns[nHalf][n]; };
-    hn::Vec<D> aoSums[kKernels];
-    AddMirrored(oTag, oWeights, oPair, oMiddle, aoSums);
-    return Result(aoSums, oTag);
+    const auto oColumn = [&](std::size_t n, std::size_t x) HWY_ATTR
+    { return aoColumns[x].aoSums[n][0]; };
+    const auto oPair = [&](std::size_t n, std::size_t k, std::size_t) HWY_ATTR
+    { return hn::Add(oColumn(n, k), oColumn(n, 2 * nHalf - k)); };
+    const auto oMiddle = [&](std::size_t n, std::size_t) HWY_ATTR { return oColumn(n, nHalf); };
+    return Result(AddMirrored<1>(oTag, oWeights, oPair, oMiddle), 0);
 }
 
 template <std::size_t kKernels>

@@ -10,7 +10,7 @@ namespace
 {
 
 // Long, since little is done with a sample: three rows of this length stay in the second cache.
-constexpr std::size_t kTileSamples = 8192;
+constexpr std::size_t kShortestTile = 8192;
 
 }  // namespace
 
@@ -20,7 +20,7 @@ void FilterGradient(const tessel::Raster& oIn, const tessel::Mask* poMaskIn,
 {
     StencilBlock oBlock(oIn, poMaskIn, oOut, poMaskOut, Window{1, 1},
                         SampleTypesOf<double, double>(oParameters.mbBGZero));
-    oBlock.mnTileSamples = kTileSamples;
+    oBlock.mnShortestTile = kShortestTile;
     oBlock.mnGroupRows = 1;
     FilterRows(oBlock, 0, oIn.mnHeight,
                [&](const kernels::StencilRows& oRows, const StencilPlace&,

@@ -12,11 +12,17 @@ namespace kor::filters::stencil
 namespace
 {
 
-/// Whole pixels, and many beside those that the windows reach over on both sides.
+/// Whole pixels: as many as let the rows of the windows and of the results stay in the first cache,
+/// but many beside those that the windows reach over on both sides.
 std::size_t TilePixels(const StencilBlock& oBlock)
 {
+    constexpr std::size_t kCachedSamples = 3072;
+    constexpr std::size_t kVectorSamples = 16;
+    const std::size_t nRows = oBlock.moWindow.GetHeight() + 2 * std::size_t{oBlock.mnGroupRows};
+    const std::size_t nSamples =
+        std::max(oBlock.mnShortestTile, kCachedSamples / nRows / kVectorSamples * kVectorSamples);
     const std::size_t nChannels = oBlock.moIn.mnChannels;
-    const std::size_t nPixels = (oBlock.mnTileSamples + nChannels - 1) / nChannels;
+    const std::size_t nPixels = (nSamples + nChannels - 1) / nChannels;
     return std::min<std::size_t>(std::max(nPixels, 4 * oBlock.moWindow.GetWidth()),
                                  oBlock.moIn.mnWidth);
 }

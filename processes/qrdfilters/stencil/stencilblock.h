@@ -39,10 +39,8 @@ struct StencilBlock
     SampleTypes moTypes;
     std::unique_ptr<tessel::Raster> mpoValid;  ///< the input mask, 0 or 1 a pixel; null as that is
     MaskedSamples meMasked = MaskedSamples::eMarked;
-    /// Samples of a row that are worked on together, give or take: as many as let the rows of the
-    /// windows stay in the first cache.
-    std::size_t mnTileSamples = 256;
-    std::uint32_t mnGroupRows = 4;  ///< output rows that a core is given at a time
+    std::size_t mnShortestTile = 64;  ///< samples of a row that are worked on together, at least
+    std::uint32_t mnGroupRows = 4;    ///< output rows that a core is given at a time
 };
 
 /// Where a group of output rows stands.

@@ -5,10 +5,19 @@
 
 #include "processes/qrdfilters/engine/channels.h"
 #include "processes/qrdfilters/findbyte.h"
+#include "processes/qrdfilters/kernels/prefetch.h"
 #include "processes/qrdfilters/kernels/windowsums.h"
 
 namespace kor::filters::stencil
 {
+
+namespace
+{
+
+// Rows that are fetched before they are wanted: enough for the latency of memory.
+constexpr std::int64_t kRowsAhead = 2;
+
+}  // namespace
 
 TileRows::TileRows(const StencilBlock& oBlock, std::size_t nTilePixels)
     : moBlock(oBlock),
@@ -68,9 +77,23 @@ const kernels::StencilRows& TileRows::Around(std::uint32_t nRow, std::uint32_t n
 
 void TileRows::Load(std::int64_t y)
 {
+    PrefetchSamplesOf(y + kRowsAhead);
     const unsigned char* pValid = moBlock.mpoValid != nullptr ? ValidSamples(y) : nullptr;
     LoadSamplesOf(y, pValid);
     Mark(y, pValid);
+}
+
+/// The next rows of a tile lie a whole row of the block apart, where the processor does not look.
+void TileRows::PrefetchSamplesOf(std::int64_t y) const
+{
+    if (y >= std::int64_t{moBlock.moIn.mnHeight} + moBlock.moWindow.mnHalfY)
+    {
+        return;
+    }
+    const unsigned char* const pFirst = moBlock.moIn.GetPixel(mnLeft, y);
+    const unsigned char* const pEnd =
+        moBlock.moIn.GetPixel(mnLeft + static_cast<std::int64_t>(mnPixels), y);
+    kernels::PrefetchBytes({pFirst, pEnd});
 }
 
 void TileRows::LoadSamplesOf(std::int64_t y, const unsigned char* pValid)

@@ -25,6 +25,7 @@ public:
 
 private:
     void Load(std::int64_t y);
+    void PrefetchSamplesOf(std::int64_t y) const;
     void LoadSamplesOf(std::int64_t y, const unsigned char* pValid);
     /// The validity of row y, a byte a sample; null where all are valid.
     const unsigned char* ValidSamples(std::int64_t y);

@@ -81,6 +81,24 @@ TEST(RequireType, NamesTheParameter)
                   "poRasterIn has samples of 32 bits of another type than the filter reads"));
 }
 
+TEST(RequireDoubleBlocks, LooksAtTypesAndAtWhatFiltersRelyOn)
+{
+    const auto poBlock = BlankRaster(2, 2, 1, eDT_64R);
+    const auto poFloat = BlankRaster(2, 2, 1, eDT_32R);
+    const auto poWide = BlankRaster(3, 2, 1, eDT_64R);
+    const auto oMessage = [](const tessel::Raster& oIn, const tessel::Raster& oOut)
+    { return MessageOf([&] { RequireDoubleBlocks(oIn, nullptr, oOut, nullptr, kSource); }); };
+    EXPECT_EQ(oMessage(*poBlock, *poBlock), "");
+    EXPECT_EQ(oMessage(*poFloat, *poBlock),
+              InHardenedBuilds(
+                  "poRasterIn has samples of 32 bits of another type than the filter reads"));
+    EXPECT_EQ(oMessage(*poBlock, *poFloat),
+              InHardenedBuilds(
+                  "poRasterOut has samples of 32 bits of another type than the filter reads"));
+    EXPECT_EQ(oMessage(*poBlock, *poWide),
+              InHardenedBuilds("poRasterOut has 3 x 2 pixels, poRasterIn 2 x 2 pixels"));
+}
+
 TEST(RequireWindowInside, LooksAtTheMarginsOfBlockAndMask)
 {
     Random oRandom(1);

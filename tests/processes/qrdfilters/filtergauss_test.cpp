@@ -222,6 +222,19 @@ TEST(FilterGauss, KeepsItsKernelsWhenVariancesAreRefused)
     EXPECT_EQ(FilteredPixel(oFilter, oImage), dfExpected);
 }
 
+TEST(FilterGauss, KeepsVariancesThatWereRefused)
+{
+    struct OpenFilter : FilterGauss
+    {
+        using FilterGauss::ComputeKernel;
+        using FilterGauss::FilterGauss;
+    };
+    OpenFilter oFilter(1.0, 0.0);
+    EXPECT_NO_THROW(oFilter.ComputeKernel());
+    EXPECT_THROW(oFilter.SetSigma(4.0, 0.5), ParameterException);
+    EXPECT_THROW(oFilter.ComputeKernel(), ParameterException);
+}
+
 void ExpectRefused(const FilterGauss& oFilter, Margins oMargins, const std::string& oName,
                    const std::string& oMessage)
 {
