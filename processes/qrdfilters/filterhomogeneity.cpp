@@ -134,11 +134,16 @@ class PairBatch
 {
 public:
     explicit PairBatch(std::size_t nColumns)
-        : mvfSums(kPairRows * nColumns), mvfCounts(kPairRows * nColumns)
     {
+        // Rows that begin in different lines of the cache: a power of two would put all of them
+        // into the same few.
+        constexpr std::size_t kLine = 16;
+        const std::size_t nStride = nColumns + kLine;
+        mvfSums.resize(kPairRows * nStride);
+        mvfCounts.resize(kPairRows * nStride);
         for (std::size_t k = 0; k < kPairRows; ++k)
         {
-            maoRows[k] = {mvfSums.data() + k * nColumns, mvfCounts.data() + k * nColumns};
+            maoRows[k] = {mvfSums.data() + k * nStride, mvfCounts.data() + k * nStride};
         }
     }
     PairBatch(const PairBatch&) = delete;

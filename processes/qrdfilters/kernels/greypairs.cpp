@@ -1,7 +1,5 @@
 #include "processes/qrdfilters/kernels/greypairs.h"
 
-#include <array>
-
 #include "processes/qrdfilters/kernels/targets.h"
 
 #undef HWY_TARGET_INCLUDE
@@ -9,10 +7,12 @@
 #include <hwy/foreach_target.h>
 #include <hwy/highway.h>
 
-// The compiler makes vectors of the target of the loops over columns and over rows.
+// The compiler makes vectors of the target of the loops over columns.
 HWY_BEFORE_NAMESPACE();
 namespace kor::filters::kernels::HWY_NAMESPACE
 {
+
+namespace hn = hwy::HWY_NAMESPACE;
 
 /// Sums of one column while a row's pairs are added (fSign 1) or subtracted (-1). T is the type of
 /// the division. A pair that does not count adds 0, which changes no sum: none is ever -0.
@@ -82,32 +82,128 @@ void MovePairs(const GreyRows& oLeaving, const GreyRows& oEntering, bool bExact,
     pfnUpdate(oLeaving, oEntering, nColumns, oFrom, oTo);
 }
 
+// Rows are chains of additions of their own: lanes are rows.
+constexpr hn::CappedTag<float, 4> kTag;
+constexpr std::size_t kLanes = hn::MaxLanes(kTag);
+using Vector = hn::Vec<decltype(kTag)>;
+
+/// kLanes vectors seen as a square are mirrored at the diagonal.
+HWY_INLINE void Transpose([[maybe_unused]] Vector* poRows)
+{
+#if HWY_TARGET != HWY_SCALAR
+    const Vector oLower01 = hn::InterleaveLower(kTag, poRows[0], poRows[1]);
+    const Vector oUpper01 = hn::InterleaveUpper(kTag, poRows[0], poRows[1]);
+    const Vector oLower23 = hn::InterleaveLower(kTag, poRows[2], poRows[3]);
+    const Vector oUpper23 = hn::InterleaveUpper(kTag, poRows[2], poRows[3]);
+    poRows[0] = hn::ConcatLowerLower(kTag, oLower23, oLower01);
+    poRows[1] = hn::ConcatUpperUpper(kTag, oLower23, oLower01);
+    poRows[2] = hn::ConcatLowerLower(kTag, oUpper23, oUpper01);
+    poRows[3] = hn::ConcatUpperUpper(kTag, oUpper23, oUpper01);
+#endif
+}
+
+/// The sums, or the counts, of the windows of kLanes rows on their way along the rows.
+class WindowTrack
+{
+public:
+    HWY_INLINE WindowTrack(const PairSums* aoRows, const PairSums* aoWindows,
+                           float* PairSums::*pMember)
+        : moSum(hn::Zero(kTag))
+    {
+        for (std::size_t k = 0; k < kLanes; ++k)
+        {
+            mapfColumns[k] = aoRows[k].*pMember;
+            mapfWindows[k] = aoWindows[k].*pMember;
+        }
+    }
+
+    HWY_INLINE void Add(std::size_t c) { moSum = hn::Add(moSum, Column(c)); }
+
+    /// One pixel, the columns of which go from i to i + nSpan.
+    HWY_INLINE void Slide(std::size_t i, std::size_t nSpan)
+    {
+        HWY_ALIGN float afSums[kLanes];
+        Add(i + nSpan);
+        hn::Store(moSum, kTag, afSums);
+        for (std::size_t k = 0; k < kLanes; ++k)
+        {
+            mapfWindows[k][i] = afSums[k];
+        }
+        moSum = hn::Sub(moSum, Column(i));
+    }
+
+    /// kLanes pixels from i on.
+    HWY_INLINE void SlideSquare(std::size_t i, std::size_t nSpan)
+    {
+        Vector aoEntering[kLanes];
+        Vector aoLeaving[kLanes];
+        for (std::size_t k = 0; k < kLanes; ++k)
+        {
+            aoEntering[k] = hn::LoadU(kTag, mapfColumns[k] + i + nSpan);
+            aoLeaving[k] = hn::LoadU(kTag, mapfColumns[k] + i);
+        }
+        Transpose(aoEntering);
+        Transpose(aoLeaving);
+        Vector aoSums[kLanes];
+        for (std::size_t x = 0; x < kLanes; ++x)
+        {
+            aoSums[x] = hn::Add(moSum, aoEntering[x]);
+            moSum = hn::Sub(aoSums[x], aoLeaving[x]);
+        }
+        Transpose(aoSums);
+        for (std::size_t k = 0; k < kLanes; ++k)
+        {
+            hn::StoreU(aoSums[k], kTag, mapfWindows[k] + i);
+        }
+    }
+
+private:
+    HWY_INLINE Vector Column(std::size_t c) const
+    {
+        HWY_ALIGN float afColumn[kLanes];
+        for (std::size_t k = 0; k < kLanes; ++k)
+        {
+            afColumn[k] = mapfColumns[k][c];
+        }
+        return hn::Load(kTag, afColumn);
+    }
+
+    const float* mapfColumns[kLanes];
+    float* mapfWindows[kLanes];
+    Vector moSum;
+};
+
+/// Slides the sums and the counts of kLanes rows.
+void SlideRows(const PairSums* aoRows, std::size_t nWindow, std::size_t nPixels,
+               const PairSums* aoWindows)
+{
+    WindowTrack oSums(aoRows, aoWindows, &PairSums::mpfSums);
+    WindowTrack oCounts(aoRows, aoWindows, &PairSums::mpfCounts);
+    const std::size_t nSpan = nWindow - 1;
+    for (std::size_t c = 0; c < nSpan; ++c)
+    {
+        oSums.Add(c);
+        oCounts.Add(c);
+    }
+    std::size_t i = 0;
+    for (; i + kLanes <= nPixels; i += kLanes)
+    {
+        oSums.SlideSquare(i, nSpan);
+        oCounts.SlideSquare(i, nSpan);
+    }
+    for (; i < nPixels; ++i)
+    {
+        oSums.Slide(i, nSpan);
+        oCounts.Slide(i, nSpan);
+    }
+}
+
 void SlidePairs(const PairSums* aoRows, std::size_t nWindow, std::size_t nPixels,
                 const PairSums* aoWindows)
 {
-    // Each row is a chain of additions of its own; together they fill the processor.
-    std::array<float, kPairRows> afSums{};
-    std::array<float, kPairRows> afCounts{};
-    for (std::size_t c = 0; c + 1 < nWindow; ++c)
+    for (std::size_t k = 0; k < kPairRows; k += kLanes)
     {
-        for (std::size_t k = 0; k < kPairRows; ++k)
-        {
-            afSums[k] = afSums[k] + aoRows[k].mpfSums[c];
-            afCounts[k] = afCounts[k] + aoRows[k].mpfCounts[c];
-        }
-    }
-    for (std::size_t i = 0; i < nPixels; ++i)
-    {
-        for (std::size_t k = 0; k < kPairRows; ++k)
-        {
-            const PairSums& oRow = aoRows[k];
-            afSums[k] = afSums[k] + oRow.mpfSums[i + nWindow - 1];
-            afCounts[k] = afCounts[k] + oRow.mpfCounts[i + nWindow - 1];
-            aoWindows[k].mpfSums[i] = afSums[k];
-            aoWindows[k].mpfCounts[i] = afCounts[k];
-            afSums[k] = afSums[k] - oRow.mpfSums[i];
-            afCounts[k] = afCounts[k] - oRow.mpfCounts[i];
-        }
+        SlideRows(aoRows + k, nWindow, nPixels, aoWindows + k);
     }
 }
 
