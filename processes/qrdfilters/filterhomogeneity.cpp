@@ -303,18 +303,19 @@ public:
 
     void Process16Histogram(Raster* poRaster, Mask* poMask) override
     {
-        const GreyBins oBins(mdfMin, mdfMax);
+        const kernels::GreyScale oScale = ScaleOf(mdfMin, mdfMax, mvnHistogram.size());
+        std::vector<int> vnBins(poRaster->mnWidth);
         const auto oRow = [&](std::size_t /*y*/, std::span<const double> vdfSamples,
                               std::span<const unsigned char> oValid)
         {
             std::int64_t nCount = 0;
+            kernels::FindBins(oScale, vdfSamples, vnBins.data());
             for (std::size_t i = 0; i < vdfSamples.size(); ++i)
             {
-                const int nBin = oBins.Find(vdfSamples[i], mvnHistogram.size());
                 nCount += oValid[i];
-                if (oValid[i] != 0 && nBin >= 0)
+                if (oValid[i] != 0 && vnBins[i] >= 0)
                 {
-                    Count(mvnHistogram[static_cast<std::size_t>(nBin)], 1);
+                    Count(mvnHistogram[static_cast<std::size_t>(vnBins[i])], 1);
                 }
             }
             Count(mnCount, nCount);

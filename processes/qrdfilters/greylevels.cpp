@@ -9,23 +9,18 @@ namespace kor::filters
 namespace
 {
 
-/// Calls oFind for parts of the samples, which writes the bins of a part, and looks up their
-/// levels.
-template <class Find>
-void LookUpBins(std::span<const double> vdfSamples, const std::vector<float>& vfLevels,
-                const Find& oFind, float* pfLevels)
+/// vfLevels holds the level of what has no bin, and behind it those of the bins.
+void LookUpBins(const kernels::GreyScale& oScale, std::span<const double> vdfSamples,
+                const std::vector<float>& vfLevels, float* pfLevels)
 {
     std::array<int, 512> anBins;
     while (!vdfSamples.empty())
     {
         const std::size_t nCount = std::min(vdfSamples.size(), anBins.size());
+        kernels::FindBins(oScale, vdfSamples.first(nCount), anBins.data());
         for (std::size_t i = 0; i < nCount; ++i)
         {
-            anBins[i] = oFind(vdfSamples[i]);
-        }
-        for (std::size_t i = 0; i < nCount; ++i)
-        {
-            pfLevels[i] = anBins[i] < 0 ? 0.0F : vfLevels[static_cast<std::size_t>(anBins[i])];
+            pfLevels[i] = vfLevels[static_cast<std::size_t>(anBins[i] + 1)];
         }
         vdfSamples = vdfSamples.subspan(nCount);
         pfLevels += nCount;
@@ -34,41 +29,32 @@ void LookUpBins(std::span<const double> vdfSamples, const std::vector<float>& vf
 
 }  // namespace
 
-GreyBins::GreyBins(double dfMin, double dfMax)
-    : mdfMin(dfMin), mdfRange(dfMax - dfMin), mbByValue(mdfRange > -1e-9 && mdfRange < 1e-9)
+kernels::GreyScale ScaleOf(double dfMin, double dfMax, std::size_t nBins)
 {
+    const double dfRange = dfMax - dfMin;
+    // Too narrow a range to divide by: the value itself is the bin.
+    const bool bByValue = dfRange > -1e-9 && dfRange < 1e-9;
+    return {dfMin, dfRange, bByValue, static_cast<double>(nBins)};
 }
 
 GreyLevels::GreyLevels(double dfMin, double dfMax, std::span<const int> oHist2Glev)
-    : mdfMin(dfMin),
-      mdfMax(dfMax),
-      moBins(dfMin, dfMax),
-      mvfLevels(oHist2Glev.begin(), oHist2Glev.end())
+    : moRange(ScaleOf(dfMin, dfMax, oHist2Glev.size())), moOpen(moRange), mvfLevels(1)
 {
-    float fLowest = 0.0F;
-    float fHighest = 0.0F;
-    for (const float fLevel : mvfLevels)
-    {
-        fLowest = fLevel < fLowest ? fLevel : fLowest;
-        fHighest = fLevel > fHighest ? fLevel : fHighest;
-    }
-    mfSpan = fHighest - fLowest;
+    moRange.mdfLowest = dfMin;
+    moRange.mdfHighest = dfMax;
+    mvfLevels.insert(mvfLevels.end(), oHist2Glev.begin(), oHist2Glev.end());
+    const auto [itLowest, itHighest] = std::minmax_element(mvfLevels.begin(), mvfLevels.end());
+    mfSpan = *itHighest - *itLowest;
 }
 
 void GreyLevels::LookUpInRange(std::span<const double> vdfSamples, float* pfLevels) const
 {
-    const auto oFind = [&, nBins = mvfLevels.size()](double x)
-    {
-        const int nBin = moBins.Find(x, nBins);
-        return x >= mdfMin && x <= mdfMax ? nBin : -1;
-    };
-    LookUpBins(vdfSamples, mvfLevels, oFind, pfLevels);
+    LookUpBins(moRange, vdfSamples, mvfLevels, pfLevels);
 }
 
 void GreyLevels::LookUp(std::span<const double> vdfSamples, float* pfLevels) const
 {
-    const auto oFind = [&, nBins = mvfLevels.size()](double x) { return moBins.Find(x, nBins); };
-    LookUpBins(vdfSamples, mvfLevels, oFind, pfLevels);
+    LookUpBins(moOpen, vdfSamples, mvfLevels, pfLevels);
 }
 
 std::vector<int> MakeGreyTable(std::span<const int> oHistogram, int nCount, int nGrey)

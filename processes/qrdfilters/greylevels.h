@@ -5,30 +5,16 @@
 #include <span>
 #include <vector>
 
+#include "processes/qrdfilters/kernels/greybins.h"
+
 namespace kor::filters
 {
 
 /// Bins between the smallest and the greatest sample value.
 inline constexpr std::size_t kGreyBins = 65536;
 
-/// The bins that sample values fall into.
-class GreyBins
-{
-public:
-    GreyBins(double dfMin, double dfMax);
-
-    /// Position of the bin of x in a table of nBins, or -1 where it lies outside.
-    int Find(double x, std::size_t nBins) const
-    {
-        const double dfBin = mbByValue ? x : (x - mdfMin) * 65535.0 / mdfRange;
-        return static_cast<int>(dfBin > -1.0 && dfBin < static_cast<double>(nBins) ? dfBin : -1.0);
-    }
-
-private:
-    double mdfMin;
-    double mdfRange;
-    bool mbByValue;  ///< too narrow a range to divide by: the value itself is the bin
-};
+/// How the values of a range fall into nBins bins. mdfLowest and mdfHighest are left open.
+kernels::GreyScale ScaleOf(double dfMin, double dfMax, std::size_t nBins);
 
 /// Turns sample values into grey levels by a table, of which it keeps a copy.
 class GreyLevels
@@ -45,10 +31,9 @@ public:
     float GetSpan() const { return mfSpan; }
 
 private:
-    double mdfMin;
-    double mdfMax;
-    GreyBins moBins;
-    std::vector<float> mvfLevels;
+    kernels::GreyScale moRange;
+    kernels::GreyScale moOpen;
+    std::vector<float> mvfLevels;  ///< behind that of what has no bin
     float mfSpan = 0.0F;
 };
 

@@ -38,28 +38,32 @@ TEST(MakeGreyTable, CountsBeyondTheRangeOfInt)
     EXPECT_EQ(MakeGreyTable(Table{nMost - 1, 0, 1, 0}, nMost, 1), (Table{0, 0, 0, 1}));
 }
 
-TEST(GreyBins, CutTheRangeInto65536Bins)
+int BinOf(double dfMin, double dfMax, double x, std::size_t nBins = kGreyBins)
 {
-    const GreyBins oBins(-10.0, 10.0);
-    EXPECT_EQ(oBins.Find(-10.0, kGreyBins), 0);
-    EXPECT_EQ(oBins.Find(10.0, kGreyBins), 65535);
-    EXPECT_EQ(oBins.Find(0.0, kGreyBins), 32767);  // 32767.5, cut
-    EXPECT_EQ(oBins.Find(10.001, kGreyBins), -1);
-    EXPECT_EQ(oBins.Find(-10.001, kGreyBins), -1);
-    EXPECT_EQ(oBins.Find(-10.0001, kGreyBins), 0);  // -0.3, cut towards zero
-    EXPECT_EQ(oBins.Find(std::nan(""), kGreyBins), -1);
-    EXPECT_EQ(oBins.Find(10.0, 10), -1);
+    return kernels::FindBin(ScaleOf(dfMin, dfMax, nBins), x);
 }
 
-TEST(GreyBins, AreTheValuesWhereTheRangeIsAlmostZero)
+TEST(GreyScale, CutsTheRangeInto65536Bins)
 {
-    const GreyBins oBins(5.0, 5.0 + 0.9e-9);
-    EXPECT_EQ(oBins.Find(5.5, kGreyBins), 5);
-    EXPECT_EQ(oBins.Find(65535.9, kGreyBins), 65535);
-    EXPECT_EQ(oBins.Find(65536.0, kGreyBins), -1);
-    EXPECT_EQ(oBins.Find(-1.0, kGreyBins), -1);
-    EXPECT_EQ(oBins.Find(1e300, kGreyBins), -1);
-    EXPECT_EQ(GreyBins(0.0, 1.1e-9).Find(1.1e-9, kGreyBins), 65535);
+    EXPECT_EQ(BinOf(-10, 10, -10.0), 0);
+    EXPECT_EQ(BinOf(-10, 10, 10.0), 65535);
+    EXPECT_EQ(BinOf(-10, 10, 0.0), 32767);  // 32767.5, cut
+    EXPECT_EQ(BinOf(-10, 10, 10.001), -1);
+    EXPECT_EQ(BinOf(-10, 10, -10.001), -1);
+    EXPECT_EQ(BinOf(-10, 10, -10.0001), 0);  // -0.3, cut towards zero
+    EXPECT_EQ(BinOf(-10, 10, std::nan("")), -1);
+    EXPECT_EQ(BinOf(-10, 10, 10.0, 10), -1);
+}
+
+TEST(GreyScale, IsTheValueWhereTheRangeIsAlmostZero)
+{
+    const double dfMax = 5.0 + 0.9e-9;
+    EXPECT_EQ(BinOf(5, dfMax, 5.5), 5);
+    EXPECT_EQ(BinOf(5, dfMax, 65535.9), 65535);
+    EXPECT_EQ(BinOf(5, dfMax, 65536.0), -1);
+    EXPECT_EQ(BinOf(5, dfMax, -1.0), -1);
+    EXPECT_EQ(BinOf(5, dfMax, 1e300), -1);
+    EXPECT_EQ(BinOf(0.0, 1.1e-9, 1.1e-9), 65535);
 }
 
 TEST(GreyLevels, AreZeroOutsideTheRangeAndTheTable)
