@@ -191,10 +191,19 @@ private:
             return;
         }
         const unsigned char* const pIn = moIn.GetPixel(0, y) + x * mnPixelBytesIn;
+        unsigned char* const pOut = moOut.GetPixel(0, y) + x * mnPixelBytesOut;
+        if (NeedsNoCopies(nPixels))
+        {
+            mpfA = reinterpret_cast<const float*>(pIn);
+            mpfOut = reinterpret_cast<float*>(pOut);
+            Evaluate(oValid);
+            return;
+        }
+        mpfA = mvfA.data();
+        mpfOut = mvfOut.data();
         LoadOperands(pIn, nPixels);
         FillInvalid(oValid, nFirstValid);
         Evaluate(oValid);
-        unsigned char* const pOut = moOut.GetPixel(0, y) + x * mnPixelBytesOut;
         const bool bAllValid = nFirstValid == 0 && FindByte(oValid, 0, 0) == nPixels;
         if (bAllValid && moOut.mnChannels == 1)
         {
@@ -206,6 +215,14 @@ private:
             FindStore(moOut.moDataType.GetSampleBytes())(oValid, mvStored.data(), pOut,
                                                          mnPixelBytesOut);
         }
+    }
+
+    /// True where the blocks' own floats can be worked on: nothing is masked or padded.
+    bool NeedsNoCopies(std::size_t nPixels) const
+    {
+        return moWork.mnIn == kFloat && moWork.mnOut == kFloat && !moWork.mbStoresInput &&
+               moIn.mnChannels == 1 && moOut.mnChannels == 1 && mpoMask == nullptr &&
+               moIn.mpBuffer != moOut.mpBuffer && nPixels % kernels::kAriPadding == 0;
     }
 
     /// The front of each pixel: the first nSamples channels.
@@ -263,7 +280,8 @@ private:
             return;
         }
         const AriExtremes oFormer = moExtremes;
-        EvaluateRow(moWork.moRow, oValid, moExtremes);
+        kernels::EvaluateRow(moWork.moRow, mpfA, mvfB.data(), {mpfOut, PaddedSize(oValid)},
+                             moExtremes);
         // Of zeros of both signs the first one is the extreme: whether +0 or -0 decides the order
         // of the pixels, which vectors do not keep.
         const bool bNewMin = moExtremes.mfMin == 0.0F && oFormer.mfMin != 0.0F;
@@ -276,25 +294,16 @@ private:
         }
     }
 
-    void EvaluateRow(const AriRow& oRow, std::span<const unsigned char> oValid,
-                     AriExtremes& oExtremes)
-    {
-        kernels::EvaluateRow(oRow, mvfA.data(), mvfB.data(), {mvfOut.data(), PaddedSize(oValid)},
-                             oExtremes);
-    }
-
     /// The first result of the chunk that is a zero and counts.
-    float FirstZero(std::span<const unsigned char> oValid)
+    float FirstZero(std::span<const unsigned char> oValid) const
     {
-        const std::vector<float> vfResults(mvfOut);
         AriRow oRow = moWork.moRow;
         oRow.mbScales = false;
         oRow.mfZeroDivision = 1.0F;  // does not count
         AriExtremes oIgnored = moExtremes;
-        EvaluateRow(oRow, oValid, oIgnored);
-        const float fZero = *std::find(mvfOut.begin(), mvfOut.end(), 0.0F);
-        mvfOut = vfResults;
-        return fZero;
+        std::vector<float> vfResults(PaddedSize(oValid));
+        kernels::EvaluateRow(oRow, mpfA, mvfB.data(), vfResults, oIgnored);
+        return *std::find(vfResults.begin(), vfResults.end(), 0.0F);
     }
 
     /// The results of an operator that is none: the former pixel's.
@@ -314,7 +323,7 @@ private:
                     mfValue = mfValue > oRow.mfHigh ? oRow.mfHigh : mfValue;
                 }
             }
-            mvfOut[i] = mfValue;
+            mpfOut[i] = mfValue;
         }
     }
 
@@ -326,7 +335,7 @@ private:
         }
         else
         {
-            details::ConvertRow(kFloat, moWork.mnOut, mvfOut.data(), pOut, nPixels);
+            details::ConvertRow(kFloat, moWork.mnOut, mpfOut, pOut, nPixels);
         }
     }
 
@@ -352,6 +361,8 @@ private:
     std::vector<float> mvfA;
     std::vector<float> mvfB;
     std::vector<float> mvfOut;
+    const float* mpfA = nullptr;  ///< the operands and results of the chunk, in the vectors above
+    float* mpfOut = nullptr;      ///< or in the blocks themselves
 };
 
 /// What all pairs of types share.

@@ -272,7 +272,7 @@ TEST(FilterARI, TheFirstOfZerosOfBothSignsIsTheExtreme)
         Filtered<float>(oFilter, Floats(vfSamples.size(), vfSamples));
         return std::make_pair(oFilter.GetARIMin(), oFilter.GetARIMax());
     };
-    std::vector<float> vfSamples(40, -1.0F);
+    std::vector<float> vfSamples(48, -1.0F);
     vfSamples[17] = -0.0F;
     vfSamples[18] = 0.0F;
     EXPECT_TRUE(std::signbit(oExtremes(vfSamples).second));
@@ -426,9 +426,33 @@ TEST(FilterARI, GivesTheBitsOfTheDefinition)
                     {nOper}, {12.5F}, {-9.0F}, {nScale}, {-500.0F, 700.0F, 3.0F, 250.0F}};
                 ExpectDefinition<float, float>(oParameters, 37, 5, nChannels, oRandom);
                 ExpectDefinition<double, short>(oParameters, 1, 9, nChannels, oRandom);
+                ExpectDefinition<float, float>(oParameters, 1056, 2, nChannels, oRandom);
                 ExpectDefinition<unsigned char, float>(oParameters, 2100, 1, nChannels, oRandom);
             }
         }
+    }
+}
+
+// Whole vectors of floats are worked on where they lie, in place as well.
+TEST(FilterARI, WorksInPlace)
+{
+    Random oRandom(17);
+    for (const std::uint32_t nWidth : {16U, 1024U, 1040U, 1050U})
+    {
+        const Parameters oParameters = {{2}, {2.5F}, {}, {3}, {-500.0F, 700.0F, 0.0F, 250.0F}};
+        const FilterARI oFilter = MakeFilter(oParameters);
+        const auto poRaster =
+            RandomRaster(nWidth, 3, 1, tessel::eDT_32R, Margins{1, 1}, Samples::Special, oRandom);
+        const auto poExpected = BlankRaster(nWidth, 3, 1, tessel::eDT_32R, Margins{1, 1});
+        std::memcpy(poExpected->mpBuffer, poRaster->mpBuffer, poRaster->mnBufferSize);
+        *poRaster->GetPixelAs<float>(3, 1) = 2.5F;  // a zero among the results
+        float fMin = kGreatest;
+        float fMax = -kGreatest;
+        FilterByDefinition<float, float>(oParameters, *poRaster, nullptr, *poExpected, fMin, fMax);
+        oFilter.Process(poRaster.get(), nullptr, poRaster.get());
+        EXPECT_TRUE(SameBits(*poRaster, *poExpected)) << nWidth;
+        EXPECT_TRUE(SameSample(oFilter.GetARIMin(), fMin));
+        EXPECT_TRUE(SameSample(oFilter.GetARIMax(), fMax));
     }
 }
 
