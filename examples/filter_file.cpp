@@ -23,6 +23,7 @@
 #include "examples/filterfile/filtertable.h"
 #include "examples/filterfile/names.h"
 #include "examples/filterfile/outputfile.h"
+#include "examples/filterfile/stripreader.h"
 #include "examples/filterfile/terminal.h"
 #include "platform/datasources/basicreader.h"
 #include "platform/datasources/basicwriter.h"
@@ -105,8 +106,9 @@ public:
         {
             throw std::runtime_error(oFile + " holds no image channels");
         }
-        std::vector<unsigned int> vnChannels =
-            oArguments.TakeRanges("channels", poImage->GetChannelCount());
+        std::vector<unsigned int>& vnChannels = moImage.mvnChannels;
+        moImage.moFile = oFile;
+        vnChannels = oArguments.TakeRanges("channels", poImage->GetChannelCount());
         if (vnChannels.empty())
         {
             vnChannels = ChannelsUpTo(poImage->GetChannelCount());
@@ -134,6 +136,8 @@ public:
     }
 
     datasources::IRasterReader& GetReader() const { return *mpoReader; }
+    tessel::IMaskBuilder* GetMaskBuilder() const { return mpoMask.get(); }
+    const examples::SourceImage& GetImage() const { return moImage; }
     /// Size, channels and type as filters see them: complex samples as real ones.
     RasterInfo GetInfo() const
     {
@@ -146,10 +150,13 @@ public:
     {
         parallelio::FilterAlgorithm& oAlgorithm = oFilter.moAlgorithm;
         oAlgorithm.SetMasksMissingData(!mbNoMask);
-        if (oFilter.mbNeedsMask && mpoMask == nullptr)
+        std::vector<double> vdfNoData = mpoReader->GetAuxiliaryData().GetNoDataValues();
+        // Who looks at the image by himself has to see what the run would mask by itself.
+        const bool bMasksForLook = oFilter.mfnLook != nullptr && !mbNoMask &&
+                                   (mpoReader->GetDataType().mbFloat || !vdfNoData.empty());
+        if (mpoMask == nullptr && (oFilter.mbNeedsMask || bMasksForLook))
         {
-            mpoMask = std::make_unique<filters::ValidMaskBuilder>(
-                mpoReader->GetAuxiliaryData().GetNoDataValues());
+            mpoMask = std::make_unique<filters::ValidMaskBuilder>(std::move(vdfNoData));
         }
         oAlgorithm.SetMaskBuilder(mpoMask.get());
         if (mpoReader->GetDataType().mbComplex)
@@ -207,12 +214,49 @@ private:
         }
     }
 
+    examples::SourceImage moImage;
     std::unique_ptr<datasources::IDataset> mpoDataset;
     std::unique_ptr<datasources::IRasterReader> mpoReader;
     std::unique_ptr<tessel::IMaskBuilder> mpoMask;
     bool mbNoMask = false;
     tessel::KORInterpretationTypes meComplex = tessel::eKIT_Magnitude;
     DataType moType;
+};
+
+class FirstLook : public examples::IFirstLook
+{
+public:
+    FirstLook(const Source& oSource, const PreparedFilter& oFilter, const DataType& oOutput,
+              std::uint64_t nBudget)
+        : moSource(oSource),
+          moFilter(oFilter),
+          moOutput(oOutput),
+          mnBudget(nBudget),
+          moStrips(oSource.GetReader(), nBudget)
+    {
+    }
+
+    const examples::SourceImage& GetImage() const override { return moSource.GetImage(); }
+    DataType GetOutputType() const override { return moOutput; }
+    datasources::IRasterReader& GetReader() override { return moStrips; }
+    tessel::IMaskBuilder* GetMaskBuilder() override { return moSource.GetMaskBuilder(); }
+    void RunFilter() override
+    {
+        parallelio::FilterDriver<examples::TerminalStatus> oDriver(moFilter.moAlgorithm);
+        oDriver.SetMemoryBudget(mnBudget);
+        oDriver.Run(&moSource.GetReader(), nullptr);
+        if (examples::IsInterrupted())
+        {
+            throw examples::Interrupted();
+        }
+    }
+
+private:
+    const Source& moSource;
+    const PreparedFilter& moFilter;
+    DataType moOutput;
+    std::uint64_t mnBudget;
+    examples::StripReader moStrips;
 };
 
 /// True when a sample of the type can have the value.
@@ -229,25 +273,30 @@ bool CanHold(const DataType& oType, double dfValue)
 }
 
 /// What the input says about itself, as far as it holds for the output.
-datasources::AuxiliaryData DataFor(const RasterInfo& oOut, datasources::AuxiliaryData oData,
-                                   unsigned int nChannelsIn)
+datasources::AuxiliaryData DataFor(const RasterInfo& oOut, const PreparedFilter& oFilter,
+                                   const datasources::IRasterReader& oReader)
 {
+    const datasources::AuxiliaryData oData = oReader.GetAuxiliaryData();
     datasources::AuxiliaryData oKept;
     oKept.SetFileMetadata(oData.GetFileMetadata());
-    if (oOut.mnChannels != nChannelsIn)
+    if (!oFilter.mbNewChannels && oOut.mnChannels == oReader.GetChannelCount())
     {
-        return oKept;
+        for (const auto& [nChannel, oChannel] : oData.GetChannels())
+        {
+            oKept.SetChannel(oChannel, nChannel);
+        }
     }
-    for (auto [nChannel, oChannel] : oData.GetChannels())
+    for (unsigned int nChannel = 1; nChannel <= oOut.mnChannels; ++nChannel)
     {
-        if (oChannel.mdfNoData && !CanHold(oOut.moDataType, *oChannel.mdfNoData))
+        std::optional<double> dfNoData =
+            oFilter.mdfNoData ? oFilter.mdfNoData : oKept.GetChannelNoData(nChannel);
+        if (dfNoData && !CanHold(oOut.moDataType, *dfNoData))
         {
             std::cerr << "filter_file: the output's type cannot hold the no-data value "
-                      << *oChannel.mdfNoData << " of channel " << nChannel
-                      << "; the output names none\n";
-            oChannel.mdfNoData.reset();
+                      << *dfNoData << " of channel " << nChannel << "; the output names none\n";
+            dfNoData.reset();
         }
-        oKept.SetChannel(oChannel, nChannel);
+        oKept.SetChannelNoData(dfNoData, nChannel);
     }
     return oKept;
 }
@@ -320,8 +369,12 @@ int FilterFile(const std::string& oIn, const std::string& oOut, const std::strin
     datasources::IRasterDataset& oImage = oFile.GetDataset();
     oImage.CreateChannels(oInfo);
     oImage.SetGeocodingInfo(oSource.GetReader().GetGeocodingInfo());
-    oImage.SetAuxiliaryData(DataFor(oInfo, oSource.GetReader().GetAuxiliaryData(),
-                                    oSource.GetReader().GetChannelCount()));
+    oImage.SetAuxiliaryData(DataFor(oInfo, oFilter, oSource.GetReader()));
+    if (oFilter.mfnLook)
+    {
+        FirstLook oLook(oSource, oFilter, oInfo.moDataType, nBudget);
+        oFilter.mfnLook(oLook);
+    }
 
     parallelio::StageTimes oTimes;
     {
@@ -333,8 +386,7 @@ int FilterFile(const std::string& oIn, const std::string& oOut, const std::strin
     }
     if (examples::IsInterrupted())
     {
-        std::cerr << "filter_file: interrupted; " << oOut << " was not made\n";
-        return kInterrupted;
+        throw examples::Interrupted();
     }
     const auto oClosing = std::chrono::steady_clock::now();
     oFile.Finish();
@@ -371,6 +423,11 @@ int main(int nArguments, char* apszArguments[])
     }
     catch (const std::exception& oError)
     {
+        if (examples::IsInterrupted())  // whatever became of that on its way here
+        {
+            std::cerr << "filter_file: interrupted; " << oWords[2] << " was not made\n";
+            return kInterrupted;
+        }
         std::cerr << "filter_file: " << oError.what() << '\n';
         return kFailed;
     }

@@ -10,6 +10,7 @@ std::span<const FilterGroup> GetFilterGroups()
     static const FilterGroup kGroups[] = {
         {"Spatial filters", GetSpatialFilters()},
         {"Radar filters", GetRadarFilters()},
+        {"Transforms", GetTransformFilters()},
     };
     return kGroups;
 }

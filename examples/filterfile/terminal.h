@@ -1,5 +1,7 @@
 #pragma once
 
+#include <stdexcept>
+
 #include "processes/qrdfilters/parallelio/filteriodriver.h"
 
 namespace kor::examples
@@ -9,6 +11,13 @@ namespace kor::examples
 void CatchInterrupts();
 /// True when an end was asked for.
 bool IsInterrupted();
+
+/// Thrown to end what is under way when that is so.
+class Interrupted : public std::runtime_error
+{
+public:
+    Interrupted() : std::runtime_error("interrupted") {}
+};
 
 /// Shows the progress of a run on standard error where that is a terminal, and ends the run when it
 /// is asked for.

@@ -6,9 +6,13 @@
 
 #include <chrono>
 #include <cstdint>
+#include <cstring>
 #include <filesystem>
 #include <memory>
+#include <numeric>
+#include <optional>
 #include <thread>
+#include <vector>
 
 #include "platform/datasources/basicreader.h"
 #include "platform/datasources/basicwriter.h"
@@ -50,6 +54,24 @@ protected:
             BlankRaster(oReader.GetWidth(), oReader.GetHeight(), 1, oReader.GetDataType());
         oReader.ReadRaster(poRaster.get());
         return ImageOf<T>(*poRaster);
+    }
+    std::optional<double> NoDataOf(const std::string& oName) const
+    {
+        return datasources::BasicReader(moFolder.File(oName), {1}, 0)
+            .GetAuxiliaryData()
+            .GetChannelNoData(1);
+    }
+    /// A KORDSK file of one block.
+    std::string MakeFile(const std::string& oName, const tessel::Raster& oPixels) const
+    {
+        const std::unique_ptr<datasources::IDataset> poDataset(
+            DatasetManager::GetInstance()->NewDataset(moFolder.File(oName), "KORDSK", ""));
+        auto& oImage = dynamic_cast<datasources::IRasterDataset&>(*poDataset);
+        oImage.CreateChannels(oPixels);
+        std::vector<unsigned int> vnChannels(oPixels.mnChannels);
+        std::iota(vnChannels.begin(), vnChannels.end(), 1U);
+        datasources::BasicWriter(&oImage, vnChannels).WriteRaster(&oPixels);
+        return moFolder.File(oName);
     }
     /// A KORDSK file of zeros in 16 bits.
     std::string MakeZeros(const std::string& oName, std::uint32_t nWidth, std::uint32_t nHeight,
@@ -231,14 +253,155 @@ TEST_F(FilterFile, TellsItsFiltersAndTheirParameters)
     EXPECT_NE(oHelp.moSaid.find("window=7"), std::string::npos) << oHelp.moSaid;
 }
 
+TEST_F(FilterFile, ComputesWithOneChannelAndNamesWhatItFillsHolesWith)
+{
+    const std::string oGrid = WriteGrid();
+    const ProgramRun oRun =
+        Run(oGrid, "product.tif", "arithmetic operator=multiply constant=2.5 fill=-1");
+    ASSERT_EQ(oRun.mnStatus, 0) << oRun.moComplaint;
+    EXPECT_EQ(Read<float>("product.tif"),
+              (Image<float>{{2.5F, 5, 7.5F}, {10, -1, 15}, {17.5F, 20, 225}}));
+    EXPECT_EQ(NoDataOf("product.tif"), -1.0);
+
+    ASSERT_EQ(Run(oGrid, "bits.tif", "arithmetic operator=and constant=6").mnStatus, 0);
+    EXPECT_EQ(Read<std::int32_t>("bits.tif"),
+              (Image<std::int32_t>{{0, 2, 2}, {4, 0, 6}, {6, 0, 2}}));
+    EXPECT_EQ(NoDataOf("bits.tif"), std::nullopt);
+}
+
+// Quotients 4, 2, 1.5 and 9; the zero divisor is left out of the range and of the scale. The last
+// one is cut at the range of the third run.
+TEST_F(FilterFile, ScalesResultsToTheRangeThatTheyHave)
+{
+    const auto poPixels = RasterOf(Image<std::uint16_t>{{8, 2, 8, 4, 3, 2, 9, 1, 5, 0}}, {}, 2);
+    const std::string oFile = MakeFile("two.kordsk", *poPixels);
+    const std::string oDivide = "arithmetic operator=divide zerodiv=7 ";
+    ASSERT_EQ(Run(oFile, "plain.kordsk", oDivide).mnStatus, 0);
+    EXPECT_EQ(Read<float>("plain.kordsk"), (Image<float>{{4, 2, 1.5F, 9, 7}}));
+    const ProgramRun oRun = Run(oFile, "scaled.tif", oDivide + "scale=0,150 type=8U");
+    ASSERT_EQ(oRun.mnStatus, 0) << oRun.moComplaint;
+    EXPECT_EQ(Read<std::uint8_t>("scaled.tif"), (Image<std::uint8_t>{{50, 10, 0, 150, 7}}));
+    ASSERT_EQ(Run(oFile, "range.tif", oDivide + "scale=0,200 range=0,8 type=8U").mnStatus, 0);
+    EXPECT_EQ(Read<std::uint8_t>("range.tif"), (Image<std::uint8_t>{{100, 50, 38, 200, 7}}));
+}
+
+TEST_F(FilterFile, ScalesWhatComplexSamplesAreSeenAs)
+{
+    const auto poPixels = BlankRaster(2, 1, 1, tessel::eDT_C32R);
+    const float afParts[] = {3.0F, 4.0F, 0.0F, -2.0F};
+    std::memcpy(poPixels->mpBuffer, afParts, sizeof(afParts));
+    const ProgramRun oRun = Run(MakeFile("complex.kordsk", *poPixels), "out.tif",
+                                "arithmetic operator=add constant=1 scale=20,80");
+    ASSERT_EQ(oRun.mnStatus, 0) << oRun.moComplaint;
+    EXPECT_EQ(Read<float>("out.tif"), (Image<float>{{80, 20}}));
+}
+
+TEST_F(FilterFile, ClearsValidPixelsOrMaskedOnes)
+{
+    const std::string oGrid = WriteGrid();
+    ASSERT_EQ(Run(oGrid, "valid.tif", "clear values=5").mnStatus, 0);
+    EXPECT_EQ(Read<std::int32_t>("valid.tif"),
+              (Image<std::int32_t>{{5, 5, 5}, {5, -9999, 5}, {5, 5, 5}}));
+    ASSERT_EQ(Run(oGrid, "masked.tif", "clear where=masked values=5").mnStatus, 0);
+    EXPECT_EQ(Read<std::int32_t>("masked.tif"),
+              (Image<std::int32_t>{{1, 2, 3}, {4, 5, 6}, {7, 8, 90}}));
+    const auto poPixels = RasterOf(Image<std::uint8_t>{{1, 2, 3, 4, 5, 6}}, {}, 3);
+    const std::string oFile = MakeFile("three.kordsk", *poPixels);
+    ASSERT_EQ(Run(oFile, "all.kordsk", "clear values=300.7,-1").mnStatus, 0);
+    EXPECT_EQ(Read<std::uint8_t>("all.kordsk", 1), (Image<std::uint8_t>{{255, 255}}));
+    EXPECT_EQ(Read<std::uint8_t>("all.kordsk", 3), (Image<std::uint8_t>{{0, 0}}));
+    ASSERT_EQ(Run(oFile, "none.kordsk", "clear where=masked").mnStatus, 0);
+    EXPECT_EQ(Read<std::uint8_t>("none.kordsk", 2), (Image<std::uint8_t>{{2, 5}}));
+}
+
+// Columns of two levels side by side: of the four neighbours one is alike and three are half
+// alike. The pixels below the last row have their neighbours to the east alone, those left of the
+// first column none to the south-west, and those right of the last column none at all.
+TEST_F(FilterFile, MeasuresHomogeneityOnLevelsOfTheWholeImage)
+{
+    const Image<std::uint16_t> oStripes = {
+        {0, 90, 0, 90}, {0, 90, 0, 90}, {0, 90, 0, 90}, {0, 90, 0, 90}};
+    const ProgramRun oRun = Run(MakeFile("stripes.kordsk", *RasterOf(oStripes)), "out.tif",
+                                "homogeneity window=3 levels=2 edge=mirror");
+    ASSERT_EQ(oRun.mnStatus, 0) << oRun.moComplaint;
+    const float f = 2.5F / 4;
+    const float fBelow = (6 * 2.5F + 3 * 0.5F) / (6 * 4 + 3);
+    const float fLeft = (2.0F + 2 * 2.5F) / (3 + 2 * 4);
+    const float fCorner = (2 * (2.0F + 2 * 2.5F) + 3 * 0.5F) / (2 * (3 + 2 * 4) + 3);
+    EXPECT_EQ(Read<float>("out.tif"), (Image<float>{{fLeft, f, f, f},
+                                                    {fLeft, f, f, f},
+                                                    {fLeft, f, f, f},
+                                                    {fCorner, fBelow, fBelow, fBelow}}));
+    // One level: the hole is 0, and its neighbours are alike without it.
+    ASSERT_EQ(Run(WriteGrid(), "grid.tif", "homogeneity window=1 levels=1").mnStatus, 0);
+    EXPECT_EQ(Read<float>("grid.tif").Samples()[4], 0.0F);
+    EXPECT_EQ(Read<float>("grid.tif").Samples()[0], 1.0F);
+    EXPECT_EQ(NoDataOf("grid.tif"), std::nullopt);
+}
+
+TEST_F(FilterFile, MarksSamplesByThresholds)
+{
+    const std::string oGrid = WriteGrid();
+    const auto oMarked = [&](const std::string& oWords)
+    {
+        const ProgramRun oRun = Run(oGrid, "out.tif", "threshold replace=yes " + oWords);
+        EXPECT_EQ(oRun.mnStatus, 0) << oRun.moComplaint;
+        return Read<std::uint8_t>("out.tif");
+    };
+    using Bytes = Image<std::uint8_t>;
+    EXPECT_EQ(oMarked("thresholds=6"), (Bytes{{0, 0, 0}, {0, 0, 1}, {1, 1, 1}}));
+    EXPECT_EQ(oMarked("thresholds=6 ones=below"), (Bytes{{1, 1, 1}, {1, 0, 0}, {0, 0, 0}}));
+    EXPECT_EQ(oMarked("thresholds=2,6"), (Bytes{{0, 1, 1}, {1, 0, 1}, {0, 0, 0}}));
+    EXPECT_EQ(oMarked("thresholds=2,6 ones=outside"), (Bytes{{1, 1, 0}, {0, 0, 1}, {1, 1, 1}}));
+    EXPECT_EQ(NoDataOf("out.tif"), std::nullopt);
+}
+
+TEST_F(FilterFile, SaysWhatItsTransformsNeed)
+{
+    const std::string oGrid = WriteGrid();
+    const std::string oThree = MakeZeros("three.kordsk", 2, 1, 3);
+    const auto oComplaint = [&](const std::string& oIn, const std::string& oWords)
+    {
+        const ProgramRun oRun = Run(oIn, "new.tif", oWords);
+        EXPECT_EQ(oRun.mnStatus, 2) << oWords;
+        return oRun.moComplaint;
+    };
+    const std::pair<const char*, const char*> kCases[] = {
+        {"arithmetic", "operator= cannot be used; it takes one of add, subtract"},
+        {"arithmetic operator=add scale=5,1",
+         "scale=5,1 cannot be used; it takes two numbers, the lower one first"},
+        {"arithmetic operator=add scale=", "scale= cannot be used; it takes numbers"},
+        {"arithmetic operator=add range=0,1", "range= says what is scaled; it needs scale="},
+        {"clear values=1,2", "values= has 2 numbers for 1 channels"},
+        {"homogeneity window=3x5", "window=3x5 cannot be used; it takes one number"},
+        {"homogeneity levels=256", "levels=256 cannot be used; it takes numbers from 1 to 255"},
+        {"threshold", "threshold needs thresholds=: one number, or two"},
+        {"threshold thresholds=1,2,3", "threshold needs thresholds=: one number, or two"},
+        {"threshold thresholds=1 ones=inside", "ones=inside cannot be used; it takes one of below"},
+    };
+    for (const auto& [pszWords, pszComplaint] : kCases)
+    {
+        EXPECT_NE(oComplaint(oGrid, pszWords).find(pszComplaint), std::string::npos) << pszWords;
+    }
+    EXPECT_NE(oComplaint(oThree, "arithmetic operator=add").find("takes one or two channels"),
+              std::string::npos);
+    EXPECT_NE(oComplaint(oThree, "homogeneity").find("takes one channel"), std::string::npos);
+    const auto poComplex = BlankRaster(2, 1, 1, tessel::eDT_C32R);
+    EXPECT_NE(
+        oComplaint(MakeFile("complex.kordsk", *poComplex), "homogeneity").find("real samples"),
+        std::string::npos);
+    EXPECT_FALSE(moFolder.Names().contains("new.tif"));
+}
+
 /// Starts the program behind a terminal of its own.
-pid_t StartBehindTerminal(const std::string& oIn, const std::string& oOut, int& nTerminal)
+pid_t StartBehindTerminal(const std::string& oIn, const std::string& oOut, int& nTerminal,
+                          const char* pszFilter = "average")
 {
     const pid_t nProcess = forkpty(&nTerminal, nullptr, nullptr, nullptr);
     if (nProcess == 0)
     {
         const std::string oProgram = std::string(KOR_EXAMPLES_FOLDER) + "/filter_file";
-        execl(oProgram.c_str(), oProgram.c_str(), oIn.c_str(), oOut.c_str(), "average", "window=31",
+        execl(oProgram.c_str(), oProgram.c_str(), oIn.c_str(), oOut.c_str(), pszFilter, "window=31",
               "memory=8", nullptr);
         _exit(127);
     }
@@ -288,6 +451,27 @@ TEST_F(FilterFile, EndsAtCtrlCAndLeavesNoFile)
     close(nTerminal);
     EXPECT_TRUE(WIFEXITED(nStatus) && WEXITSTATUS(nStatus) == 130) << oText;
     EXPECT_NE(oText.find("interrupted"), std::string::npos) << oText;
+    EXPECT_EQ(moFolder.Names(), (std::set<std::string>{"in.kordsk"}));
+}
+
+// The bar begins while the image is looked at, long before the first block.
+TEST_F(FilterFile, EndsAtCtrlCWhileItLooksAtTheImage)
+{
+    int nTerminal = -1;
+    const pid_t nProcess =
+        StartBehindTerminal(MakeZeros("in.kordsk", 10000, 10000), moFolder.File("out.kordsk"),
+                            nTerminal, "homogeneity");
+    ASSERT_GT(nProcess, 0);
+    char cFirst = 0;
+    ASSERT_EQ(read(nTerminal, &cFirst, 1), 1);
+    ASSERT_EQ(write(nTerminal, "\x03", 1), 1);
+    const std::string oText = ReadAll(nTerminal);
+    int nStatus = 0;
+    waitpid(nProcess, &nStatus, 0);
+    close(nTerminal);
+    EXPECT_TRUE(WIFEXITED(nStatus) && WEXITSTATUS(nStatus) == 130) << oText;
+    EXPECT_NE(oText.find("interrupted; "), std::string::npos) << oText;
+    EXPECT_EQ(oText.find("100 %"), std::string::npos) << oText;
     EXPECT_EQ(moFolder.Names(), (std::set<std::string>{"in.kordsk"}));
 }
 
