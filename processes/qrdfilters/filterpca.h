@@ -5,10 +5,16 @@
 #include <utility>
 #include <vector>
 
+#include "basic/tessel/mask/imaskbuilder.h"
 #include "basic/tessel/mask/mask.h"
 #include "basic/tessel/raster/raster.h"
 #include "processes/qrdfilters/iprocessor.h"
 #include "processes/qrdfilters/typedfilter.h"
+
+namespace kor::datasources
+{
+class IBitmapDataset;
+}
 
 /// Principal components of the channels of an image: first the statistics of the image, then the
 /// transform of its blocks.
@@ -64,6 +70,9 @@ public:
     };
     template <class T>
     class InnerStatsProcessor;
+    /// The processor for blocks of a real type; the caller owns it. Throws kor::Exception "Invalid
+    /// type requested." for others.
+    static IStatsProcessor* MakeStatsProcessor(const tessel::DataType& oType);
 
     /// oInputs: channels to analyse, numbered from 1. oOutputs and oEigens: channels that the
     /// transform is to be written to, and the number of the component (from 1) for each; they are
@@ -110,6 +119,8 @@ public:
                 std::vector<unsigned int> oRows) const;
 
 private:
+    std::unique_ptr<tessel::IMaskBuilder> MakeSelector(
+        datasources::IBitmapDataset* poBitmaps) const;
     void PrintSample() const;
 
     std::string moFileName;

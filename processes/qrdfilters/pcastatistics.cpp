@@ -149,6 +149,38 @@ void LimitTiles(datasources::IRasterReader& oReader)
     }
 }
 
+void WriteMeans(const std::vector<double>& vdfSums, double dfCount, std::vector<float>& vfMeans)
+{
+    for (std::size_t i = 0; i < vdfSums.size(); ++i)
+    {
+        SetElement(vfMeans, i, static_cast<float>(vdfSums[i] / dfCount));
+    }
+}
+
+void WriteCovariance(const std::vector<double>& vdfSums, const std::vector<double>& vdfProducts,
+                     double dfCount, std::vector<float>& vfCovariance,
+                     std::vector<float>& vfDeviations)
+{
+    const std::size_t nInputs = vdfSums.size();
+    std::size_t k = 0;
+    for (std::size_t i = 0; i < nInputs; ++i)
+    {
+        for (std::size_t j = i; j < nInputs; ++j)
+        {
+            const double dfMeans = (vdfSums[j] / dfCount) * (vdfSums[i] / dfCount);
+            const auto fCovariance = static_cast<float>(vdfProducts[k++] / dfCount - dfMeans);
+            SetElement(vfCovariance, i * nInputs + j, fCovariance);
+            SetElement(vfCovariance, j * nInputs + i, fCovariance);
+            if (i == j)
+            {
+                const double dfVariance = fCovariance;
+                SetElement(vfDeviations, i,
+                           static_cast<float>(dfVariance > 0.0 ? std::sqrt(dfVariance) : 0.0));
+            }
+        }
+    }
+}
+
 }  // namespace
 
 template <class T>
@@ -184,41 +216,50 @@ void PCAStatistics::SetSegMask(int nSignature, int nBitmap)
     mnBitmap = nBitmap;
 }
 
+PCAStatistics::IStatsProcessor* PCAStatistics::MakeStatsProcessor(const tessel::DataType& oType)
+{
+    using Factory = typedispatch::Factory1Template<InnerStatsProcessor, IStatsProcessor>;
+    using List = typedispatch::StandardTypeList;
+    using End = typedispatch::typeconv::priv::NullDataType;
+    return typedispatch::ExtendDispatchTypes<Factory, 1, List, List, End>::Dispatch({oType}, false);
+}
+
+std::unique_ptr<tessel::IMaskBuilder> PCAStatistics::MakeSelector(
+    datasources::IBitmapDataset* poBitmaps) const
+{
+    if (mnBitmap != 0)
+    {
+        return std::make_unique<datasources::BitmapMaskBuilder>(
+            poBitmaps, static_cast<unsigned int>(mnBitmap), false);
+    }
+    if (mvnWindow.size() == 4)
+    {
+        return std::make_unique<FilteringMaskBuilder>(
+            std::vector<int>(mvnWindow.begin(), mvnWindow.end()), std::vector<float>(),
+            std::vector<float>());
+    }
+    return nullptr;
+}
+
 void PCAStatistics::GetRasterStats(std::vector<float>& oCovariance, std::vector<float>& oMeans,
                                    std::vector<float>& oDeviations)
 {
     const std::unique_ptr<datasources::IDataset> poDataset(
         datasources::DatasetManager::GetInstance()->Open(moFileName, 0));
     datasources::BasicReader oReader(poDataset.get(), mvnInputs);
-    std::unique_ptr<tessel::IMaskBuilder> poSelector;
-    if (mnBitmap != 0)
+    auto* const poBitmaps = dynamic_cast<datasources::IBitmapDataset*>(poDataset.get());
+    if (mnBitmap != 0 && poBitmaps == nullptr)
     {
-        auto* const poBitmaps = dynamic_cast<datasources::IBitmapDataset*>(poDataset.get());
-        if (poBitmaps == nullptr)
-        {
-            throw Exception("This dataset doesn't support bitmap segment", kSource,
-                            __PRETTY_FUNCTION__, __LINE__);
-        }
-        poSelector = std::make_unique<datasources::BitmapMaskBuilder>(
-            poBitmaps, static_cast<unsigned int>(mnBitmap), false);
+        throw Exception("This dataset doesn't support bitmap segment", kSource, __PRETTY_FUNCTION__,
+                        __LINE__);
     }
-    else if (mvnWindow.size() == 4)
-    {
-        poSelector = std::make_unique<FilteringMaskBuilder>(
-            std::vector<int>(mvnWindow.begin(), mvnWindow.end()), std::vector<float>(),
-            std::vector<float>());
-    }
+    const std::unique_ptr<tessel::IMaskBuilder> poSelector = MakeSelector(poBitmaps);
 
     mnSampleSize = 0;
     const auto nInputs = static_cast<std::size_t>(mnInputs);
     std::vector<double> vdfSums(nInputs);
     std::vector<double> vdfProducts(nInputs * (nInputs + 1) / 2);
-    using Factory = typedispatch::Factory1Template<InnerStatsProcessor, IStatsProcessor>;
-    using List = typedispatch::StandardTypeList;
-    const std::unique_ptr<IStatsProcessor> poProcessor(
-        typedispatch::ExtendDispatchTypes<
-            Factory, 1, List, List,
-            typedispatch::typeconv::priv::NullDataType>::Dispatch({oReader.GetDataType()}, false));
+    const std::unique_ptr<IStatsProcessor> poProcessor(MakeStatsProcessor(oReader.GetDataType()));
     LimitTiles(oReader);
     const datasources::RasterIterator itEnd = oReader.End();
     for (datasources::RasterIterator it = oReader.Begin(); it != itEnd; ++it)
@@ -227,26 +268,9 @@ void PCAStatistics::GetRasterStats(std::vector<float>& oCovariance, std::vector<
         const std::unique_ptr<Mask> poMask(poSelector ? poSelector->BuildMask(*poRaster) : nullptr);
         poProcessor->Process(poRaster.get(), poMask.get(), vdfSums, vdfProducts, mnSampleSize);
     }
-
     const auto dfCount = static_cast<double>(mnSampleSize);
-    std::size_t k = 0;
-    for (std::size_t i = 0; i < nInputs; ++i)
-    {
-        for (std::size_t j = i; j < nInputs; ++j)
-        {
-            const double dfMeans = (vdfSums[j] / dfCount) * (vdfSums[i] / dfCount);
-            const auto fCovariance = static_cast<float>(vdfProducts[k++] / dfCount - dfMeans);
-            SetElement(oCovariance, i * nInputs + j, fCovariance);
-            SetElement(oCovariance, j * nInputs + i, fCovariance);
-            if (i == j)
-            {
-                const double dfVariance = fCovariance;
-                SetElement(oMeans, i, static_cast<float>(vdfSums[i] / dfCount));
-                SetElement(oDeviations, i,
-                           static_cast<float>(dfVariance > 0.0 ? std::sqrt(dfVariance) : 0.0));
-            }
-        }
-    }
+    WriteMeans(vdfSums, dfCount, oMeans);
+    WriteCovariance(vdfSums, vdfProducts, dfCount, oCovariance, oDeviations);
 }
 
 void PCAStatistics::ComputeEigen(int n, std::vector<float>& oMatrix,
