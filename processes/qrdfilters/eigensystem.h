@@ -14,9 +14,8 @@ namespace kor::filters
 ///          first. Row k of the matrix belongs to value k.
 /// Sign     that which the method gives, times -1: it is part of the result.
 /// Corners  a matrix of one element gives its value and the vector -1.
-/// Errors   kor::DataException "Too many iteration in eigen vector calculation." when a value is
-/// not
-///          found in 30 steps, as with elements that are not numbers; its source fields are empty.
+/// Errors   kor::DataException "Too many iteration in eigen vector calculation." when 30 steps do
+///          not find a value, as with elements that are not numbers; its source fields are empty.
 ///          The contents of both are then not told.
 /// Source   reduction to tridiagonal form: A. S. Householder, "Unitary triangularization of a
 ///          nonsymmetric matrix", Journal of the ACM 5(4), 339-342, 1958; R. S. Martin, C. Reinsch,

@@ -35,17 +35,15 @@ namespace kor::filters
 /// over the n pixels of the sample, in double, in one pass, and stored as float. Meant: the divisor
 /// is n and not n - 1.
 ///
-/// Input    channels of one real type of a file that kor::datasources::DatasetManager opens.
-/// Without
-///          a selection all pixels are the sample. A sampling window (x offset, y offset, width,
-///          height in pixels) selects those inside; a bitmap of the dataset (SetSegMask) those
-///          where it is set, and wins over a window.
+/// Input    channels of one real type of a file that kor::datasources::DatasetManager opens. The
+///          sample is all pixels, or those inside a sampling window (x offset, y offset, width,
+///          height in pixels), or those where a bitmap of the dataset (SetSegMask) is set. The
+///          bitmap wins over the window.
 /// Output   vectors that the caller sizes: what does not fit is not written, and what is missing
 ///          where they are read is 0. Matrices lie row by row.
 /// Corners  an empty sample: a sample size of 0, means and covariances that are not numbers, and
 ///          deviations of 0. A constant channel: variance and deviation 0.
-/// Errors   kor::DataException, kor::IOException and their kin from opening and reading, for
-/// example
+/// Errors   kor::DataException, kor::IOException and their kin from opening and reading, such as
 ///          for channels of different types; kor::Exception "This dataset doesn't support bitmap
 ///          segment" when a bitmap is asked of a dataset without; "Invalid type requested." for
 ///          complex channels; kor::ParameterException of FilteringMaskBuilder for a window on
@@ -182,15 +180,13 @@ protected:
 ///          wanted; float values are stored by the library's conversion rules. Margins are not
 ///          written.
 /// Masks    poMaskIn is not looked at: every pixel is transformed.
-/// Corners  a vector without an element that is needed counts as 0 there, as does a component
-/// number
-///          outside CovMat; so scale 0 gives the midpoint everywhere.
+/// Corners  scale 0 gives the midpoint everywhere. A vector without an element that is needed
+///          counts as 0 there, and so does a component whose number is outside CovMat.
 /// Errors   kor::Exception "poRasterIn is invalid pointer", "poRasterOut is invalid pointer",
 ///          "Invalid type requested." (complex types, eDT_BIT), all before anything is written; in
 ///          hardened builds also for blocks of different sizes.
-/// Threads  works on the calling thread. One object must not be called by two threads at once
-/// unless
-///          it has worked on the same pair of types before.
+/// Threads  works on the calling thread. Two threads may call one object at once after it has
+///          worked on the same pair of types.
 /// State    the processor of the last pair of types is kept; setters count when one is made. Copies
 ///          of the filter start without one. The least and greatest v of each output channel, see
 ///          PCAAlgorithm, are common to all filters of the process.
@@ -211,7 +207,8 @@ public:
 /// FilterPCA as an algorithm for the block loop of a caller.
 ///
 /// Errors   kor::Exception "You have to Set the values before calling Process."; those of
-/// FilterPCA. Threads  as of FilterPCA. Copies share the filter.
+///          FilterPCA.
+/// Threads  as of FilterPCA. Copies share the filter.
 class PCAAlgorithm
 {
 public:

@@ -40,14 +40,12 @@ void PrintNumbers(const char* pszTitle, const std::vector<unsigned int>& vnNumbe
     EndLine();
 }
 
-void PrintHead(const char* pszTitle, int nLineEnds)
+/// A title and an empty line.
+void PrintTitle(const char* pszTitle)
 {
-    EndLine();
     Report::AddInfo(pszTitle);
-    for (int i = 0; i < nLineEnds; ++i)
-    {
-        EndLine();
-    }
+    EndLine();
+    EndLine();
 }
 
 /// One output channel with the scaling that takes its component there.
@@ -117,7 +115,7 @@ void PCAStatistics::GetPCAPrint(const char* pszMode, std::vector<float> oCovaria
     }
     PrintSample();
 
-    PrintHead("  Channel               Mean        Deviation ", 2);
+    PrintTitle("  Channel               Mean        Deviation ");
     for (std::size_t i = 0; i < mvnInputs.size(); ++i)
     {
         Report::AddInfo(FormatString("  %5d      %14.6g  %14.6g", static_cast<int>(mvnInputs[i]),
@@ -127,11 +125,13 @@ void PCAStatistics::GetPCAPrint(const char* pszMode, std::vector<float> oCovaria
     }
     if (bLong)
     {
-        PrintHead(" Covariance Matrix for input channels: ", 2);
+        EndLine();
+        PrintTitle(" Covariance Matrix for input channels: ");
         matprt(1, std::move(oCovariance), mvnInputs, mvnInputs);
     }
     // Meant: both percent signs are printed.
-    PrintHead(" Eigenchannel     Eigenvalue       Deviation       %%Variance", 2);
+    EndLine();
+    PrintTitle(" Eigenchannel     Eigenvalue       Deviation       %%Variance");
     for (std::size_t i = 0; i < mvnInputs.size(); ++i)
     {
         Report::AddInfo(FormatString("  %5d       %14.4g %14.4g       %6.2g%%",
@@ -142,14 +142,18 @@ void PCAStatistics::GetPCAPrint(const char* pszMode, std::vector<float> oCovaria
     }
     if (bLong)
     {
-        PrintHead(" Eigenvectors of covariance matrix (arranged by rows): ", 2);
+        EndLine();
+        PrintTitle(" Eigenvectors of covariance matrix (arranged by rows): ");
         matprt(0, std::move(oEigenvectors), mvnInputs, mvnInputs);
     }
     if (mnOutputs > 0)
     {
-        PrintHead("Scaling Information:\n\n", 0);
+        EndLine();
+        Report::AddInfo("Scaling Information:\n\n");
         Report::AddInfo(" Eigen Output        ----Unscaled----     Deviation    Midpoint   Scale");
-        PrintHead(" Channl Chnnl        Min          Max        Range                Factor ", 0);
+        EndLine();
+        Report::AddInfo(
+            " Channl Chnnl        Min          Max        Range                Factor ");
         Report::AddInfo("\n\n");
         for (std::size_t i = 0; i < mvnOutputs.size(); ++i)
         {

@@ -269,28 +269,49 @@ TEST(PCAAlgorithm, AppendsExtremesWithEachProcessorAndCountsInThoseAtTheFront)
     EXPECT_EQ(oAlgorithm.GetMaxVal(), vfMax);
 }
 
+/// One channel x, unscaled.
+void Show(const PCAAlgorithm& oAlgorithm, float x)
+{
+    const auto poOut = BlankRaster(1, 1, 1, tessel::eDT_32R);
+    oAlgorithm.ProcessBlock(RasterOf(Image<float>{{x}}).get(), poOut.get());
+}
+
 TEST(PCAAlgorithm, ExtremesStartAtZeroAndGrowOverAllCalls)
 {
     const PCAAlgorithm oAlgorithm = Algorithm({{1}, {1}, {1}, {0}, {0}});
-    const auto poOut = BlankRaster(1, 1, 1, tessel::eDT_32R);
-    const auto oProcess = [&](float x)
-    { oAlgorithm.ProcessBlock(RasterOf(Image<float>{{x}}).get(), poOut.get()); };
-    oProcess(5e9F);
-    EXPECT_EQ(oAlgorithm.GetMaxVal()[0], 5e9F);
-    EXPECT_LE(oAlgorithm.GetMinVal()[0], 0.0F);
-    oProcess(-6e9F);
-    oProcess(std::numeric_limits<float>::quiet_NaN());
-    oProcess(1);
-    EXPECT_EQ(oAlgorithm.GetMaxVal()[0], 5e9F);
-    EXPECT_EQ(oAlgorithm.GetMinVal()[0], -6e9F);
-    for (const float f : oAlgorithm.GetMinVal())
-    {
-        EXPECT_LE(f, 0.0F);
-    }
+    Show(oAlgorithm, 0);
+    // Those of a process in which no other test has run.
+    const float fMin = oAlgorithm.GetMinVal()[0];
+    const float fMax = oAlgorithm.GetMaxVal()[0];
+    EXPECT_LE(fMin, 0.0F);
+    EXPECT_GE(fMax, 0.0F);
+    Show(oAlgorithm, 5e9F);
+    EXPECT_EQ(oAlgorithm.GetMinVal()[0], fMin);
+    EXPECT_EQ(oAlgorithm.GetMaxVal()[0], std::max(fMax, 5e9F));
+    Show(oAlgorithm, -6e9F);
+    Show(oAlgorithm, std::numeric_limits<float>::quiet_NaN());
+    Show(oAlgorithm, 1);
+    EXPECT_EQ(oAlgorithm.GetMinVal()[0], std::min(fMin, -6e9F));
+    EXPECT_EQ(oAlgorithm.GetMaxVal()[0], std::max(fMax, 5e9F));
+}
+
+// Nothing but samples above 0, and the last entries, which no sample has met.
+TEST(PCAAlgorithm, ExtremesOfWhatWasNeverMetAreZero)
+{
+    const PCAAlgorithm oAlgorithm = Algorithm({{1}, {1}, {1}, {0}, {0}});
+    Show(oAlgorithm, 1);
+    const auto poIn = RasterOf(Image<float>{{4}});
+    const auto poOut = BlankRaster(1, 1, 300, tessel::eDT_8U);
+    oAlgorithm.ProcessBlock(poIn.get(), poOut.get());
+    EXPECT_GE(oAlgorithm.GetMinVal().size(), 301U);
+    EXPECT_EQ(oAlgorithm.GetMinVal().size(), oAlgorithm.GetMaxVal().size());
+    EXPECT_EQ(oAlgorithm.GetMinVal().back(), 0.0F);
+    EXPECT_EQ(oAlgorithm.GetMaxVal().back(), 0.0F);
 }
 
 TEST(PCAAlgorithm, CountsBlocksOfSeveralThreadsExactly)
 {
+    const Floats vfBefore = PCAAlgorithm().GetMaxVal();
     std::vector<std::thread> voThreads;
     for (int i = 0; i < 4; ++i)
     {
@@ -298,11 +319,9 @@ TEST(PCAAlgorithm, CountsBlocksOfSeveralThreadsExactly)
             [i]
             {
                 const PCAAlgorithm oAlgorithm = Algorithm({{1}, {1}, {1}, {0}, {0}});
-                const auto poOut = BlankRaster(1, 1, 1, tessel::eDT_32R);
                 for (int k = 0; k < 50; ++k)
                 {
-                    const auto x = static_cast<float>(1e10 * (1 + i + 4 * k));
-                    oAlgorithm.ProcessBlock(RasterOf(Image<float>{{x}}).get(), poOut.get());
+                    Show(oAlgorithm, static_cast<float>(1e10 * (1 + i + 4 * k)));
                 }
             });
     }
@@ -310,7 +329,8 @@ TEST(PCAAlgorithm, CountsBlocksOfSeveralThreadsExactly)
     {
         oThread.join();
     }
-    EXPECT_EQ(PCAAlgorithm().GetMaxVal()[0], 2e12F);
+    EXPECT_EQ(PCAAlgorithm().GetMaxVal()[0],
+              std::max(vfBefore.empty() ? 0.0F : vfBefore[0], 2e12F));
 }
 
 TEST(PCAAlgorithm, RefusesBlocksBeforeItsValuesAreSet)

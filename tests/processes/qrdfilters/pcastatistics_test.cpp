@@ -220,6 +220,38 @@ TEST_F(PcaStatistics, RefusesWhatItCannotRead)
     EXPECT_NE(oMessage(moFolder.File("nowhere"), {1}, 0), "");
 }
 
+// The pixels inside the margins are (1, 10), (2, 20) and (3, 30); the mask leaves the second out,
+// and what the sums hold already stays.
+TEST(PcaStatsProcessor, AddsTheValidPixelsInsideTheMargins)
+{
+    const Image<short> oImage = {
+        {9, 9, 9, 9, 9, 9, 9, 9, 9, 9},
+        {9, 9, 1, 10, 2, 20, 3, 30, 9, 9},
+        {9, 9, 9, 9, 9, 9, 9, 9, 9, 9},
+    };
+    const auto poRaster = RasterOf(oImage, Margins{1, 1}, 2);
+    const auto poMask = MaskOf({{1, 1, 1, 1, 1}, {1, 1, 0, 1, 1}, {1, 1, 1, 1, 1}}, Margins{1, 1});
+    const std::unique_ptr<PCAStatistics::IStatsProcessor> poProcessor(
+        PCAStatistics::MakeStatsProcessor(poRaster->moDataType));
+    std::vector<double> vdfSums = {100, 200};
+    std::vector<double> vdfProducts = {1000, 2000, 3000};
+    long nCount = 5;
+    poProcessor->Process(poRaster.get(), poMask.get(), vdfSums, vdfProducts, nCount);
+    EXPECT_EQ(vdfSums, (std::vector<double>{104, 240}));
+    EXPECT_EQ(vdfProducts, (std::vector<double>{1010, 2100, 4000}));
+    EXPECT_EQ(nCount, 7);
+    poProcessor->Process(poRaster.get(), nullptr, vdfSums, vdfProducts, nCount);
+    EXPECT_EQ(vdfSums, (std::vector<double>{110, 300}));
+    EXPECT_EQ(nCount, 10);
+}
+
+TEST(PcaStatsProcessor, ServesTheTenRealTypesAlone)
+{
+    EXPECT_EQ(
+        MessageOf<Exception>([] { delete PCAStatistics::MakeStatsProcessor(tessel::eDT_C16S); }),
+        "Invalid type requested.");
+}
+
 // ---- The definition.
 
 template <class T>
