@@ -11,6 +11,11 @@
 #include "processes/qrdfilters/iprocessor.h"
 #include "processes/qrdfilters/typedfilter.h"
 
+namespace kor::datasources
+{
+class IRasterReader;
+}
+
 /// Homogenises an image by classes: one value for all pixels of a class. First the statistics find
 /// it, from a channel of values and a channel of classes; then the filter puts it in the place of
 /// the classes.
@@ -26,8 +31,7 @@ namespace kor::filters
 ///
 ///     mean   table[c] = int(sum / n + 0.5),  sum and quotient in float, the addition in double
 ///     mode   table[c] = the value met most often, the lowest of equal ones; the default value
-///     where
-///            its share n[value] / n is below the threshold
+///            where its share n[value] / n is below the threshold
 /// over the n pixels of class c. A class without a pixel keeps 0.
 ///
 /// Classes  the sample, as an index: floating point is cut, integers are taken as 16-bit unsigned
@@ -38,15 +42,13 @@ namespace kor::filters
 /// Types    values of eDT_32R, eDT_16U or eDT_16S with classes of eDT_8U, eDT_32R, eDT_16U or
 ///          eDT_16S, and values of eDT_8U with classes of eDT_8U, eDT_32R or eDT_16S. Meant: others
 ///          give a table of zeros without a message. Of several channels the first one counts.
-/// Corners  the table is not cleared: each GetRasterStats appends its zeros, and finds its values
-/// in
+/// Corners  the table is not cleared: each GetRasterStats appends its zeros, and its values go to
 ///          the entries at the front. A mean that no int can hold is the nearest int, one that is
 ///          not a number 0. A vector without its first element counts as 0 there.
-/// Memory   in mode mode counters for each class that the image has: 4 bytes times the lower of the
-///          numbers of classes and of values, 256 KiB at most.
-/// Errors   what opening and reading throw; kor::Exception when there is no memory for the
-/// counters. Threads  works on the calling thread. One object must not be called by two threads at
-/// once.
+/// Memory   in mode mode up to 22 bytes for each value that a class has, and 100 at least for a
+///          class that the image has.
+/// Errors   what opening and reading throw; kor::Exception when memory for the counters is short.
+/// Threads  works on the calling thread. One object must not be called by two threads at once.
 class HOMStatistics
 {
 public:
@@ -63,6 +65,8 @@ public:
     void SetMeanMode(std::vector<int> oMeanMode) { mvMeanMode = std::move(oMeanMode); }
 
 private:
+    void FillTable(datasources::IRasterReader& oValues, datasources::IRasterReader& oClasses);
+
     std::string moFileName;
     std::vector<unsigned int> mvValueChannels;
     std::vector<unsigned int> mvClassChannels;
@@ -107,9 +111,8 @@ protected:
 /// Errors   kor::Exception "poRasterIn is invalid pointer", "poRasterOut is invalid pointer",
 ///          "Invalid type to dispatch." (eDT_BIT), all before anything is written; in hardened
 ///          builds also for blocks of different sizes.
-/// Threads  works on the calling thread. One object must not be called by two threads at once
-/// unless
-///          it has worked on the same pair of types before.
+/// Threads  works on the calling thread. Two threads may call one object at once after it has
+///          worked on the same pair of types.
 /// State    the processor of the last pair of types is kept, with its table, and copies of the
 ///          filter share it: another table counts when the types change.
 class FilterHOM : public details::HOMParams, private ProcessorCache<IProcessor>
@@ -132,7 +135,8 @@ public:
 /// FilterHOM as an algorithm for the block loop of a caller.
 ///
 /// Errors   kor::Exception "You have to Set the values before calling Process."; those of
-/// FilterHOM. Threads  as of FilterHOM. Copies share the filter.
+///          FilterHOM.
+/// Threads  as of FilterHOM. Copies share the filter.
 class HOMAlgorithm
 {
 public:

@@ -13,6 +13,7 @@
 #include "platform/exception/exception.h"
 #include "processes/qrdfilters/checkedvector.h"
 #include "processes/qrdfilters/filterhom.h"
+#include "processes/qrdfilters/valuecounts.h"
 
 namespace kor::filters
 {
@@ -95,7 +96,7 @@ class Modes
 public:
     // Values from the number of classes on are counted in the totals alone: nobody looks at them.
     Modes(std::size_t nClasses, std::size_t nValues)
-        : mnValues(std::min(nClasses, nValues)), mvpCounts(nClasses), mvnTotals(nClasses)
+        : mnValues(std::min(nClasses, nValues)), mvoCounts(nClasses), mvnTotals(nClasses)
     {
     }
 
@@ -110,11 +111,7 @@ public:
         const std::size_t nValue = IndexOf(xValue);
         if (nValue < mnValues)
         {
-            if (mvpCounts[nClass] == nullptr)
-            {
-                mvpCounts[nClass] = MakeCounts(nClass);
-            }
-            mvpCounts[nClass][nValue] += 1;
+            mvoCounts[nClass].Add(static_cast<std::uint16_t>(nValue));
         }
     }
 
@@ -122,16 +119,13 @@ public:
     {
         for (std::size_t c = 0; c < mvnTotals.size(); ++c)
         {
-            std::uint32_t nBest = 0;
-            for (std::size_t j = 0; mvpCounts[c] != nullptr && j < mnValues; ++j)
+            const ValueCounts::Mode oMode = mvoCounts[c].FindMode();
+            if (oMode.mnCount > 0)
             {
-                if (mvpCounts[c][j] > nBest)
-                {
-                    nBest = mvpCounts[c][j];
-                    vnTable[c] = static_cast<int>(j);
-                }
+                vnTable[c] = static_cast<int>(oMode.mnValue);
             }
-            const float fShare = static_cast<float>(nBest) / static_cast<float>(mvnTotals[c]);
+            const float fShare =
+                static_cast<float>(oMode.mnCount) / static_cast<float>(mvnTotals[c]);
             if (mvnTotals[c] != 0 && fThreshold > fShare)
             {
                 vnTable[c] = nDefault;
@@ -140,22 +134,8 @@ public:
     }
 
 private:
-    std::unique_ptr<std::uint32_t[]> MakeCounts(std::size_t nClass) const
-    {
-        try
-        {
-            return std::make_unique<std::uint32_t[]>(mnValues);
-        }
-        catch (const std::bad_alloc&)
-        {
-            throw Exception("There is no memory to count the values of class " +
-                                std::to_string(nClass) + " beside those of other classes",
-                            "processes/qrdfilters/filterhom", __PRETTY_FUNCTION__, __LINE__);
-        }
-    }
-
     std::size_t mnValues;
-    std::vector<std::unique_ptr<std::uint32_t[]>> mvpCounts;  ///< made when the class is met
+    std::vector<ValueCounts> mvoCounts;
     std::vector<std::uint32_t> mvnTotals;
 };
 
@@ -257,6 +237,20 @@ void HOMStatistics::GetRasterStats()
     oValues.SetTileSize(oValues.GetWidth(), 1);
     oClasses.SetTileSize(oClasses.GetWidth(), 1);
     mvMeanMode.resize(mvMeanMode.size() + TableSize(oClasses.GetDataType()), 0);
+    try
+    {
+        FillTable(oValues, oClasses);
+    }
+    catch (const std::bad_alloc&)
+    {
+        throw Exception("There is no memory to count the values of the classes of " + moFileName,
+                        "processes/qrdfilters/filterhom", __PRETTY_FUNCTION__, __LINE__);
+    }
+}
+
+void HOMStatistics::FillTable(datasources::IRasterReader& oValues,
+                              datasources::IRasterReader& oClasses)
+{
     switch (ElementOf(mvCalcMode, 0))
     {
         case 0:

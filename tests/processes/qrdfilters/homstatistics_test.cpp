@@ -168,12 +168,28 @@ TEST_F(HomStatistics, SearchesTheModeAmongAsManyValuesAsThereAreClasses)
               Entries(32767, {{400, 255}}));
 }
 
-// Every class has its own counters: an image of all classes would need 16 GiB, this one a MiB.
 TEST_F(HomStatistics, CountsWideTypesByTheClassesThatOccur)
 {
     EXPECT_EQ(Table(Image<std::uint16_t>{{65535, 7, 65535, 1, 1}},
                     Image<std::uint16_t>{{60000, 60000, 60000, 0, 65535}}, kMode),
               Entries(65536, {{0, 1}, {60000, 65535}, {65535, 1}}));
+}
+
+// An array of all values for each of these classes would take 16 GiB. Class c has c, c and 7.
+TEST_F(HomStatistics, CountsInAllClassesOfAWideTypeAtOnce)
+{
+    std::vector<std::uint16_t> vnValues(3 * 65536, 7);
+    std::vector<std::uint16_t> vnClasses(vnValues.size());
+    std::vector<int> vnExpected(65536);
+    for (std::size_t i = 0; i < vnClasses.size(); ++i)
+    {
+        vnClasses[i] = static_cast<std::uint16_t>(i % 65536);
+        vnExpected[i % 65536] = vnClasses[i];
+    }
+    std::copy_n(vnClasses.begin(), 2 * 65536, vnValues.begin());
+    const Image<std::uint16_t> oValues(65536, vnValues);
+    const Image<std::uint16_t> oClasses(65536, vnClasses);
+    EXPECT_EQ(Table(oValues, oClasses, kMode), vnExpected);
 }
 
 template <class TValue, class TClass>
