@@ -105,8 +105,9 @@ public:
         {
             throw std::runtime_error(oFile + " holds no image channels");
         }
-        std::vector<unsigned int> vnChannels =
-            oArguments.TakeRanges("channels", poImage->GetChannelCount());
+        std::vector<unsigned int>& vnChannels = moImage.mvnChannels;
+        moImage.moFile = oFile;
+        vnChannels = oArguments.TakeRanges("channels", poImage->GetChannelCount());
         if (vnChannels.empty())
         {
             vnChannels = ChannelsUpTo(poImage->GetChannelCount());
@@ -134,6 +135,7 @@ public:
     }
 
     datasources::IRasterReader& GetReader() const { return *mpoReader; }
+    const examples::SourceImage& GetImage() const { return moImage; }
     /// Size, channels and type as filters see them: complex samples as real ones.
     RasterInfo GetInfo() const
     {
@@ -207,6 +209,7 @@ private:
         }
     }
 
+    examples::SourceImage moImage;
     std::unique_ptr<datasources::IDataset> mpoDataset;
     std::unique_ptr<datasources::IRasterReader> mpoReader;
     std::unique_ptr<tessel::IMaskBuilder> mpoMask;
@@ -230,11 +233,11 @@ bool CanHold(const DataType& oType, double dfValue)
 
 /// What the input says about itself, as far as it holds for the output.
 datasources::AuxiliaryData DataFor(const RasterInfo& oOut, datasources::AuxiliaryData oData,
-                                   unsigned int nChannelsIn)
+                                   bool bSameChannels)
 {
     datasources::AuxiliaryData oKept;
     oKept.SetFileMetadata(oData.GetFileMetadata());
-    if (oOut.mnChannels != nChannelsIn)
+    if (!bSameChannels)
     {
         return oKept;
     }
@@ -320,8 +323,13 @@ int FilterFile(const std::string& oIn, const std::string& oOut, const std::strin
     datasources::IRasterDataset& oImage = oFile.GetDataset();
     oImage.CreateChannels(oInfo);
     oImage.SetGeocodingInfo(oSource.GetReader().GetGeocodingInfo());
-    oImage.SetAuxiliaryData(DataFor(oInfo, oSource.GetReader().GetAuxiliaryData(),
-                                    oSource.GetReader().GetChannelCount()));
+    const bool bSameChannels =
+        !oFilter.mbNewChannels && oInfo.mnChannels == oSource.GetReader().GetChannelCount();
+    oImage.SetAuxiliaryData(DataFor(oInfo, oSource.GetReader().GetAuxiliaryData(), bSameChannels));
+    if (oFilter.mfnLook)
+    {
+        oFilter.mfnLook(oSource.GetImage(), oInfo.moDataType);
+    }
 
     parallelio::StageTimes oTimes;
     {

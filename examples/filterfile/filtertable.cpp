@@ -10,6 +10,7 @@ std::span<const FilterGroup> GetFilterGroups()
     static const FilterGroup kGroups[] = {
         {"Spatial filters", GetSpatialFilters()},
         {"Radar filters", GetRadarFilters()},
+        {"Transforms by the statistics of the image", GetStatisticsFilters()},
     };
     return kGroups;
 }

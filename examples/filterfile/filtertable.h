@@ -1,9 +1,12 @@
 #pragma once
 
 #include <cstdint>
+#include <functional>
 #include <optional>
 #include <span>
+#include <string>
 #include <string_view>
+#include <vector>
 
 #include "basic/tessel/raster/raster.h"
 #include "examples/filterfile/arguments.h"
@@ -11,6 +14,13 @@
 
 namespace kor::examples
 {
+
+/// The image in its file, for filters that look at all of it before they begin.
+struct SourceImage
+{
+    std::string moFile;
+    std::vector<unsigned int> mvnChannels;  ///< in the order in which the filter sees them
+};
 
 /// A filter with its parameters, ready to run.
 struct PreparedFilter
@@ -22,6 +32,10 @@ struct PreparedFilter
     std::optional<tessel::DataType> moType = std::nullopt;
     /// True: there has to be a mask, if all pixels are valid.
     bool mbNeedsMask = false;
+    /// True: what the input says about its channels does not hold for those of the result.
+    bool mbNewChannels = false;
+    /// Called before the first block, with the type that results are stored as.
+    std::function<void(const SourceImage& oImage, const tessel::DataType& oOut)> mfnLook = nullptr;
 };
 
 /// A filter as filter_file knows it.
@@ -48,6 +62,7 @@ const FilterEntry& FindFilter(std::string_view oName);
 
 std::span<const FilterEntry> GetSpatialFilters();
 std::span<const FilterEntry> GetRadarFilters();
+std::span<const FilterEntry> GetStatisticsFilters();
 
 /// Half of "window".
 filters::Window TakeWindow(Arguments& oArguments, std::uint32_t nDefault = 7);
