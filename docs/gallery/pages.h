@@ -13,4 +13,8 @@ void MakeRadarPage(const std::string& oFile, unsigned int nChannel,
 /// The table of the radar filters for a channel of intensities as it is, of so many looks.
 void MeasureRadarImage(const std::string& oFile, unsigned int nChannel, int nLooks);
 
+/// Principal components of a file of six bands and classes made of them: pictures to oFolder; the
+/// report of the analysis.
+void MakeTransformsPage(const std::string& oFile, const std::filesystem::path& oFolder);
+
 }  // namespace kor::gallery
