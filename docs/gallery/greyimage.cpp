@@ -61,6 +61,13 @@ GreyImage ImageOf(const Raster& oBlock)
     return oImage;
 }
 
+unsigned char Tone(double dfSample, const Scale& oScale)
+{
+    const double dfShare = (dfSample - oScale.mdfBlack) / (oScale.mdfWhite - oScale.mdfBlack);
+    return static_cast<unsigned char>(
+        std::isnan(dfShare) ? 0.0 : std::clamp(dfShare, 0.0, 1.0) * 255.0 + 0.5);
+}
+
 }  // namespace
 
 GreyImage Crop(const GreyImage& oImage, const Area& oArea)
@@ -131,10 +138,25 @@ void WritePicture(const std::string& oFile, const GreyImage& oImage, const Scale
     {
         for (std::uint32_t x = 0; x < oPixels.mnWidth; ++x)
         {
-            const double dfShare = (oImage.At(x / nZoom, y / nZoom) - oScale.mdfBlack) /
-                                   (oScale.mdfWhite - oScale.mdfBlack);
-            *oPixels.GetPixel(x, y) = static_cast<unsigned char>(
-                std::isnan(dfShare) ? 0.0 : std::clamp(dfShare, 0.0, 1.0) * 255.0 + 0.5);
+            *oPixels.GetPixel(x, y) = Tone(oImage.At(x / nZoom, y / nZoom), oScale);
+        }
+    }
+    datasources::WritePng(oFile, oPixels);
+}
+
+void WriteComposite(const std::string& oFile, const std::array<Colour, 3>& aoColours)
+{
+    const GreyImage& oSize = aoColours[0].moImage;
+    Raster oPixels({oSize.mnWidth, oSize.mnHeight, 3, tessel::eDT_8U}, {});
+    for (std::uint32_t y = 0; y < oPixels.mnHeight; ++y)
+    {
+        for (std::uint32_t x = 0; x < oPixels.mnWidth; ++x)
+        {
+            for (std::size_t c = 0; c < 3; ++c)
+            {
+                oPixels.GetPixel(x, y)[c] =
+                    Tone(aoColours[c].moImage.At(x, y), aoColours[c].moScale);
+            }
         }
     }
     datasources::WritePng(oFile, oPixels);

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <array>
 #include <cstdint>
 #include <string>
 #include <vector>
@@ -53,5 +54,13 @@ Scale ScaleOf(const GreyImage& oImage);
 /// Each pixel is drawn as nZoom x nZoom.
 void WritePicture(const std::string& oFile, const GreyImage& oImage, const Scale& oScale,
                   std::uint32_t nZoom);
+/// A channel of a picture in colour, with its scale.
+struct Colour
+{
+    GreyImage moImage;
+    Scale moScale;
+};
+/// Red, green and blue, each of the same size.
+void WriteComposite(const std::string& oFile, const std::array<Colour, 3>& aoColours);
 
 }  // namespace kor::gallery

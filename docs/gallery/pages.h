@@ -16,5 +16,8 @@ void MeasureRadarImage(const std::string& oFile, unsigned int nChannel, int nLoo
 /// Pictures of the spatial filters on a crop of a channel, to oFolder.
 void MakeSpatialPage(const std::string& oFile, unsigned int nChannel,
                      const std::filesystem::path& oFolder);
+/// Principal components of a file of six bands and classes made of them: pictures to oFolder; the
+/// report of the analysis.
+void MakeTransformsPage(const std::string& oFile, const std::filesystem::path& oFolder);
 
 }  // namespace kor::gallery

@@ -11,6 +11,7 @@ std::span<const FilterGroup> GetFilterGroups()
         {"Spatial filters", GetSpatialFilters()},
         {"Radar filters", GetRadarFilters()},
         {"Transforms", GetTransformFilters()},
+        {"Transforms by the statistics of the image", GetStatisticsFilters()},
     };
     return kGroups;
 }

@@ -82,6 +82,7 @@ const FilterEntry& FindFilter(std::string_view oName);
 std::span<const FilterEntry> GetSpatialFilters();
 std::span<const FilterEntry> GetRadarFilters();
 std::span<const FilterEntry> GetTransformFilters();
+std::span<const FilterEntry> GetStatisticsFilters();
 
 /// Half of "window".
 filters::Window TakeWindow(Arguments& oArguments, std::uint32_t nDefault = 7);

@@ -43,15 +43,24 @@ bool SameMargins(const tessel::RasterContext& a, const tessel::RasterContext& b)
 
 }  // namespace
 
-void RequireMatchingSizes(const tessel::Raster& oRasterIn, const tessel::Mask* poMaskIn,
-                          const tessel::Raster& oRasterOut, const tessel::Mask* poMaskOut,
-                          const char* pszSource, const std::source_location& oWhere)
+void RequireSameSize(const tessel::Raster& oRasterIn, const tessel::Raster& oRasterOut,
+                     const char* pszSource, const std::source_location& oWhere)
 {
     if constexpr (kHardened)
     {
         Require(SameSize(oRasterIn, oRasterOut),
                 "poRasterOut has " + Size(oRasterOut) + ", poRasterIn " + Size(oRasterIn),
                 pszSource, oWhere);
+    }
+}
+
+void RequireMatchingSizes(const tessel::Raster& oRasterIn, const tessel::Mask* poMaskIn,
+                          const tessel::Raster& oRasterOut, const tessel::Mask* poMaskOut,
+                          const char* pszSource, const std::source_location& oWhere)
+{
+    RequireSameSize(oRasterIn, oRasterOut, pszSource, oWhere);
+    if constexpr (kHardened)
+    {
         Require(poMaskIn == nullptr ||
                     (SameSize(oRasterIn, *poMaskIn) && SameMargins(oRasterIn, *poMaskIn)),
                 "poMaskIn has " + (poMaskIn != nullptr ? Geometry(*poMaskIn, *poMaskIn) : "") +

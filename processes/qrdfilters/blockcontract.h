@@ -25,6 +25,11 @@ void RequireMatchingBlocks(const tessel::Raster& oRasterIn, const tessel::Mask* 
                            const char* pszSource,
                            const std::source_location& oWhere = std::source_location::current());
 
+/// The output has the width and height of the input; its channels are the filter's own matter.
+void RequireSameSize(const tessel::Raster& oRasterIn, const tessel::Raster& oRasterOut,
+                     const char* pszSource,
+                     const std::source_location& oWhere = std::source_location::current());
+
 /// The samples of a block are of type oType. pszName is the parameter as the caller knows it.
 void RequireType(const tessel::Raster& oRaster, const tessel::DataType& oType, const char* pszName,
                  const char* pszSource,
