@@ -253,7 +253,7 @@ void SarSim1::Run::PlaceNearPoint()
     std::vector<double>& vdfPoint = moParams.NRPoint;
     if (vdfPoint.empty())
     {
-        vdfPoint = {static_cast<float>(dfLeft), static_cast<float>(dfTop)};
+        vdfPoint = {RoundedToSingle(dfLeft), RoundedToSingle(dfTop)};
     }
     moView.mnNearCol =
         Truncated((vdfPoint[0] - oMap.GetXOffset()) / moView.mdfPixelX + 0.5) - moWindow.mnX;
@@ -288,10 +288,10 @@ ElevationRange SarSim1::Run::FindElevations()
             vdfScale[1] = static_cast<double>(fLowest);
         }
     }
-    const auto dfLowest = static_cast<double>(static_cast<float>(vdfScale[0] * vdfScale[1]));
+    const double dfLowest = RoundedToSingle(vdfScale[0] * vdfScale[1]);
     const double dfSpan =
         bBytes ? vdfScale[0] * 255.0 : static_cast<double>(fHighest) * vdfScale[0];
-    return {dfLowest, static_cast<double>(static_cast<float>(dfSpan + dfLowest))};
+    return {dfLowest, RoundedToSingle(dfSpan + dfLowest)};
 }
 
 void SarSim1::Run::SampleRow(std::int64_t nRow, float& fLowest, float& fHighest)
@@ -491,8 +491,18 @@ void Describe(const char* pszText, datasources::BasicWriter& oWriter)
 
 }  // namespace
 
+void SarSim1::RequireImage() const
+{
+    if (mpoImage == nullptr)
+    {
+        throw Exception("There is no image yet: Process has not run", kSource, __PRETTY_FUNCTION__,
+                        __LINE__);
+    }
+}
+
 void SarSim1::Output(std::string oFile) const
 {
+    RequireImage();  // before a file is made
     const std::unique_ptr<datasources::IDataset> poDataset(
         datasources::DatasetManager::GetInstance()->NewDataset(oFile, "KORDSK", ""));
     Output(poDataset.get());
@@ -503,10 +513,10 @@ void SarSim1::Output(datasources::IDataset* poDataset) const
 {
     auto* poRasters = dynamic_cast<datasources::IRasterDataset*>(poDataset);
     auto* poBitmaps = dynamic_cast<datasources::IBitmapDataset*>(poDataset);
-    if (mpoImage == nullptr || poRasters == nullptr || poBitmaps == nullptr)
+    RequireImage();
+    if (poRasters == nullptr || poBitmaps == nullptr)
     {
-        throw Exception(mpoImage == nullptr ? "There is no image yet: Process has not run"
-                        : poDataset == nullptr
+        throw Exception(poDataset == nullptr
                             ? "poDataset is invalid pointer"
                             : "The dataset cannot hold the image: it needs channels and bitmaps",
                         kSource, __PRETTY_FUNCTION__, __LINE__);

@@ -136,6 +136,8 @@ private:
     class RadarImage;
     class Run;
 
+    void RequireImage() const;
+
     std::shared_ptr<const RadarImage> mpoImage;  ///< null before Process
 };
 

@@ -201,7 +201,6 @@ public:
           mpfnStore(pfnStore),
           mpoHandler(oParams.mpoUpdateHandler)
     {
-        RequireParameters();
         moWindow = WindowOf(moParams.Dbiw);
         RequireWindow(moWindow, moReader, kSource);
         mvdfRow.resize(static_cast<std::size_t>(moWindow.mnWidth));
@@ -213,7 +212,6 @@ public:
     void Simulate();
 
 private:
-    void RequireParameters() const;
     void PlaceNearPoint();
     ElevationRange FindElevations();
     RadarGrid MakeGrid(const ElevationRange& oElevations);
@@ -247,26 +245,12 @@ private:
     std::vector<float> mvfCurrent;
 };
 
-void Sarsim2::Run::RequireParameters() const
-{
-    RequireValues(moParams.Dbiw, 4, "Dbiw", kSource);
-    RequireValues(moParams.Escale, 2, "Escale", kSource);
-    RequireValues(moParams.Alti, 1, "Alti", kSource);
-    RequireValues(moParams.Head, 1, "Head", kSource);
-    RequireValues(moParams.Minlook, 1, "Minlook", kSource);
-    RequireValues(moParams.Oversamp, 1, "Oversamp", kSource);
-    if (!moParams.NRPoint.empty())
-    {
-        RequireValues(moParams.NRPoint, 2, "NRPoint", kSource);
-    }
-}
-
 /// The near range point, and the DEM's pixels, in the map. Meant: mfWindowLeftX stays 0.
 void Sarsim2::Run::PlaceNearPoint()
 {
     const ogc::cs::GeocodingInfo& oMap = moReader.GetGeocodingInfo();
-    moView.mdfPixelX = static_cast<float>(std::fabs(oMap.GetXPerCol()));
-    moView.mdfPixelY = static_cast<float>(std::fabs(oMap.GetYPerRow()));
+    moView.mdfPixelX = RoundedToSingle(std::fabs(oMap.GetXPerCol()));
+    moView.mdfPixelY = RoundedToSingle(std::fabs(oMap.GetYPerRow()));
     std::vector<double>& vdfPoint = moParams.NRPoint;
     if (vdfPoint.empty())
     {
@@ -309,10 +293,10 @@ ElevationRange Sarsim2::Run::FindElevations()
             vdfScale[1] = static_cast<double>(fLowest);
         }
     }
-    const auto dfLowest = static_cast<double>(static_cast<float>(vdfScale[0] * vdfScale[1]));
+    const double dfLowest = RoundedToSingle(vdfScale[0] * vdfScale[1]);
     const double dfSpan =
         mbBytes ? vdfScale[0] * 255.0 : static_cast<double>(fHighest) * vdfScale[0];
-    return {dfLowest, static_cast<double>(static_cast<float>(dfSpan + dfLowest))};
+    return {dfLowest, RoundedToSingle(dfSpan + dfLowest)};
 }
 
 RadarGrid Sarsim2::Run::MakeGrid(const ElevationRange& oElevations)
@@ -343,6 +327,11 @@ void Sarsim2::Run::ReadRow(std::int64_t nRow)
 {
     const std::unique_ptr<tessel::Raster> poRow(
         moReader.GetRaster(static_cast<unsigned int>(nRow)));
+    if (poRow->moDataType != moReader.GetDataType())
+    {
+        throw Exception("The reader of elevations gave a row of another type than its own", kSource,
+                        __PRETTY_FUNCTION__, __LINE__);
+    }
     const std::size_t nSampleBytes = poRow->moDataType.GetSampleBytes();
     const unsigned char* pFirst = poRow->GetPixel(0, 0);
     const auto nBytes = static_cast<std::size_t>(poRow->mpBuffer + poRow->mnBufferSize - pFirst);
@@ -583,6 +572,20 @@ Sarsim2::Sarsim2(std::vector<unsigned int> vnDbiw, std::vector<double> vdfEscale
 {
 }
 
+void Sarsim2::RequireParameters() const
+{
+    RequireValues(Dbiw, 4, "Dbiw", kSource);
+    RequireValues(Escale, 2, "Escale", kSource);
+    RequireValues(Alti, 1, "Alti", kSource);
+    RequireValues(Head, 1, "Head", kSource);
+    RequireValues(Minlook, 1, "Minlook", kSource);
+    RequireValues(Oversamp, 1, "Oversamp", kSource);
+    if (!NRPoint.empty())
+    {
+        RequireValues(NRPoint, 2, "NRPoint", kSource);
+    }
+}
+
 void Sarsim2::Process(datasources::IRasterReader* poReader,
                       datasources::IRasterWriter* poRasterWriter,
                       datasources::IRasterWriter* poLayoverWriter,
@@ -601,8 +604,12 @@ void Sarsim2::Process(datasources::IRasterReader* poReader,
         }
     }
     using Factory = typedispatch::Factory2Template<InnerProcessor, ISarSim2>;
-    const auto oMake = [](const tessel::DataType& oIn, const tessel::DataType& oOut)
-    { return typedispatch::DispatchTypePair<Factory>(oIn, oOut, false); };
+    const auto oMake = [this](const tessel::DataType& oIn, const tessel::DataType& oOut)
+    {
+        // Here, so that a worker whose lists are too short is not kept.
+        RequireParameters();
+        return typedispatch::DispatchTypePair<Factory>(oIn, oOut, false);
+    };
     SelectProcessor<details::SarSim2Params>(poReader->GetDataType(), poRasterWriter->GetDataType(),
                                             *this, oMake);
     // Held here: a handler may set this object up anew while the worker runs.

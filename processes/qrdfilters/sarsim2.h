@@ -96,8 +96,7 @@ public:
 ///          on the scan order. From 32768 on, the largest count of 16 bits turns negative; the
 ///          square roots are then not numbers, and 0 as integers. All this is meant.
 /// Errors   kor::Exception "poReader is invalid pointer", and so for poRasterWriter,
-/// poLayoverWriter
-///          and poShadowWriter; "Invalid type requested."; else those of SarSim1.
+///          poLayoverWriter and poShadowWriter; "Invalid type requested."; else those of SarSim1.
 /// Threads  works on the calling thread; one object serves one thread.
 /// State    the worker for the last pair of types is kept, with the parameters that it was made
 ///          with and with what its last run put into Escale and NRPoint. What is set later counts
@@ -128,6 +127,8 @@ public:
 private:
     class Worker;
     class Run;
+
+    void RequireParameters() const;
 };
 
 }  // namespace kor::filters

@@ -7,10 +7,8 @@
 #include "platform/datasources/basicreader.h"
 #include "platform/datasources/bitmapreader.h"
 #include "processes/qrdfilters/sarsim1.h"
-#include "tests/support/kordskfiles.h"
 #include "tests/support/memorydataset.h"
 #include "tests/support/simulationreference.h"
-#include "tests/support/temporarydirectory.h"
 
 /// Terrains and runs for tests of the radar simulators.
 namespace kor::test
@@ -53,7 +51,39 @@ inline filters::SarSim1 SimulatorOf(const SimulationInput& oInput)
     return oSimulator;
 }
 
-inline std::vector<unsigned char> ReadBitmap(datasources::KordskDataset& oDataset,
+/// Channels and bitmaps in memory; a bitmap's bits are bytes.
+class RadarDataset : public MemoryDataset, public datasources::IBitmapDataset
+{
+public:
+    unsigned int GetBitmapWidth() const override { return GetWidth(); }
+    unsigned int GetBitmapHeight() const override { return GetHeight(); }
+    unsigned int GetBitmapCount() const override
+    {
+        return static_cast<unsigned int>(mvoBitmaps.size());
+    }
+    unsigned int CreateBitmap(unsigned int nWidth, unsigned int nHeight) override
+    {
+        mvoBitmaps.emplace_back(nWidth, nHeight, std::vector<tessel::DataType>{tessel::eDT_BIT});
+        return GetBitmapCount();
+    }
+    datasources::AuxiliaryData GetBitmapAuxiliaryData(unsigned int nBitmap) const override
+    {
+        return mvoBitmaps.at(nBitmap - 1).GetAuxiliaryData();
+    }
+    void SetBitmapAuxiliaryData(const datasources::AuxiliaryData& oData,
+                                unsigned int nBitmap) override
+    {
+        mvoBitmaps.at(nBitmap - 1).SetAuxiliaryData(oData);
+    }
+    std::unique_ptr<datasources::IChannelIO> OpenBitmap(unsigned int nBitmap, bool bWrite) override
+    {
+        return mvoBitmaps.at(nBitmap - 1).OpenChannels(bWrite);
+    }
+
+    std::vector<MemoryDataset> mvoBitmaps;
+};
+
+inline std::vector<unsigned char> ReadBitmap(datasources::IBitmapDataset& oDataset,
                                              unsigned int nBitmap)
 {
     datasources::BitmapReader oReader(&oDataset, nBitmap);
@@ -62,25 +92,30 @@ inline std::vector<unsigned char> ReadBitmap(datasources::KordskDataset& oDatase
     return ImageOf<unsigned char>(*poRaster).Samples();
 }
 
-/// What a simulator writes into a new file.
-inline RadarReference OutputOf(const filters::SarSim1& oSimulator)
+/// What a simulator writes into an empty dataset that holds channels and bitmaps.
+template <class Dataset>
+RadarReference OutputOf(const filters::SarSim1& oSimulator, Dataset& oDataset)
 {
-    const TemporaryDirectory oFolder;
-    oSimulator.Output(oFolder.File("radar.kordsk"));
-    const Kordsk poDataset = OpenKordsk(oFolder.File("radar.kordsk"));
+    oSimulator.Output(static_cast<datasources::IDataset*>(&oDataset));
     RadarReference oResult;
     oResult.mnSarlin = oSimulator.GetSarlin();
     oResult.mnSarpix = oSimulator.GetSarpix();
-    oResult.mvnImage =
-        ImageOf<std::uint16_t>(
-            *ReadBlock(*poDataset, {1},
-                       {poDataset->GetWidth(), poDataset->GetHeight(), 1, tessel::eDT_16U}))
-            .Samples();
-    oResult.mvnLayover = ReadBitmap(*poDataset, 1);
-    oResult.mvnShadow = ReadBitmap(*poDataset, 2);
+    datasources::BasicReader oReader(&oDataset, {1});
+    const auto poImage =
+        BlankRaster(oReader.GetWidth(), oReader.GetHeight(), 1, oReader.GetDataType());
+    oReader.ReadRaster(poImage.get());
+    oResult.mvnImage = ImageOf<std::uint16_t>(*poImage).Samples();
+    oResult.mvnLayover = ReadBitmap(oDataset, 1);
+    oResult.mvnShadow = ReadBitmap(oDataset, 2);
     oResult.mvdfEscale = oSimulator.GetEscale();
     oResult.mvdfNRPoint = oSimulator.GetNRPoint();
     return oResult;
+}
+
+inline RadarReference OutputOf(const filters::SarSim1& oSimulator)
+{
+    RadarDataset oDataset;
+    return OutputOf(oSimulator, oDataset);
 }
 
 inline RadarReference Simulated(MemoryDataset& oDem, const SimulationInput& oInput)

@@ -6,6 +6,11 @@
 namespace kor::filters::simulation
 {
 
+double RoundedToSingle(double dfValue)
+{
+    return static_cast<float>(dfValue);
+}
+
 std::uint32_t ChannelBits(const datasources::IRasterReader& oReader, const char* pszSource)
 {
     const std::vector<tessel::RasterInfo> voChannels = oReader.GetChannelsInfo();

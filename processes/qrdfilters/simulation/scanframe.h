@@ -37,6 +37,10 @@ inline std::int64_t Truncated(double dfValue)
                                                              : std::int64_t{-2147483648};
 }
 
+/// A value in single precision. Not inline: where two values side by side are narrowed and widened
+/// again, g++ 12 drops both steps at -O2 and keeps the digits.
+double RoundedToSingle(double dfValue);
+
 /// The window of the DEM, in pixels of its dataset.
 struct DemWindow
 {
@@ -53,6 +57,7 @@ DemWindow WindowOf(const std::vector<T>& vnDbiw)
     return {std::int64_t{vnDbiw[0]}, std::int64_t{vnDbiw[1]}, std::int64_t{vnDbiw[2]},
             std::int64_t{vnDbiw[3]}};
 }
+
 /// Bits of a sample of the first channel. Throws kor::Exception when there is none.
 std::uint32_t ChannelBits(const datasources::IRasterReader& oReader, const char* pszSource);
 

@@ -7,7 +7,9 @@
 
 #include "platform/exception/exception.h"
 #include "tests/support/exceptions.h"
+#include "tests/support/kordskfiles.h"
 #include "tests/support/radarscenes.h"
+#include "tests/support/temporarydirectory.h"
 
 namespace kor::filters
 {
@@ -23,6 +25,7 @@ using test::Simulated;
 using test::SimulationInput;
 
 const auto kFlat = [](std::uint32_t, std::uint32_t) { return 100; };
+const auto kSeaLevel = [](std::uint32_t, std::uint32_t) { return 0; };
 
 /// Hills steep enough for layover and shadow, with pixels of background among them.
 MemoryDataset Hills(std::uint32_t nWidth, std::uint32_t nHeight, unsigned int nSeed)
@@ -125,7 +128,8 @@ TEST(SarSim1, PutsTheNearRangePointToTheWindowsUpperLeftCorner)
     oInput.Dbiw = {2, 1, 6, 7};
     const RadarReference oOut = Simulated(oDem, oInput);
     // 480060.1 in single precision, and 5000000 - 20.
-    EXPECT_EQ(oOut.mvdfNRPoint, (std::vector<double>{480060.09375, 4999980.0}));
+    EXPECT_EQ(oOut.mvdfNRPoint[0], 480060.09375);
+    EXPECT_EQ(oOut.mvdfNRPoint[1], 4999980.0);
     oInput.NRPoint = {480000.0, 5000000.0};
     EXPECT_EQ(Simulated(oDem, oInput).mvdfNRPoint, oInput.NRPoint);
 }
@@ -183,44 +187,68 @@ TEST(SarSim1, HeadingsAlongTheMeridianTakeTheArcFromWestToEast)
     EXPECT_NEAR(GroundRange(oSimulator, 785000.0F, 90.0F, 900.0, -300.0), 300.0, 0.1);
 }
 
-// The farthest column of a plain is the last one only where columns are mirrored: the first one,
-// at the near range, is then column mnSarpix - 1, and the farthest is column 0, which belongs to
-// the line before.
+/// A plain at 0 m with a quarter of background on the side that a heading sees first; one column
+/// wider than the window of 40 x 40 pixels, since the scan looks at it.
+MemoryDataset PlainBehindBackground(double dfHeading)
+{
+    return DemOf<std::int16_t>(41, 40,
+                               [=](std::uint32_t x, std::uint32_t y)
+                               {
+                                   const bool bNear = dfHeading < 45.0 || dfHeading > 315.0 ? x < 10
+                                                      : dfHeading < 225.0 ? x >= 30
+                                                                          : y >= 30;
+                                   return bNear ? -1 : 0;
+                               });
+}
+
+// Background at near range leaves the first columns empty, or the last ones where columns are
+// mirrored.
 TEST(SarSim1, MirrorsColumnsBetweenTheQuartersAlone)
 {
-    // One spur that all headings see: the pixel with the most counts tells the side.
-    MemoryDataset oDem = DemOf<std::int16_t>(40, 40, kFlat);
-    SimulationInput oInput = InputFor(oDem);
-    oInput.Oversamp = {1};
-    const auto oFirstColumnHits = [&](double dfHeading)
+    const std::pair<double, bool> kHeadings[] = {{0.0, false},  {0.1, true},    {180.0, true},
+                                                 {269.9, true}, {270.0, false}, {270.1, true},
+                                                 {359.9, true}, {360.0, false}};
+    for (const auto& [dfHeading, bMirrored] : kHeadings)
     {
+        MemoryDataset oDem = PlainBehindBackground(dfHeading);
+        SimulationInput oInput = InputFor(oDem);
+        oInput.Dbiw = {0, 0, 40, 40};
+        oInput.Oversamp = {1};
+        oInput.Backelev = {-1.0};
         oInput.Head = {dfHeading};
         const RadarReference oOut = Simulated(oDem, oInput);
-        std::size_t nHits = 0;
+        int nFirst = 0;
+        int nLast = 0;
         for (int y = 0; y < oOut.mnSarlin; ++y)
         {
-            nHits += oOut.mvnImage[static_cast<std::size_t>(y * oOut.mnSarpix)];
+            const auto itLine = oOut.mvnImage.begin() + y * oOut.mnSarpix;
+            nFirst += std::accumulate(itLine, itLine + 6, 0);
+            // The very last one also holds column 0 of another line.
+            nLast += std::accumulate(itLine + oOut.mnSarpix - 6, itLine + oOut.mnSarpix - 1, 0);
         }
-        return nHits;
-    };
-    const auto oLastColumnHits = [&](double dfHeading)
-    {
-        oInput.Head = {dfHeading};
-        const RadarReference oOut = Simulated(oDem, oInput);
-        std::size_t nHits = 0;
-        for (int y = 1; y <= oOut.mnSarlin; ++y)
-        {
-            nHits += oOut.mvnImage[static_cast<std::size_t>(y * oOut.mnSarpix - 1)];
-        }
-        return nHits;
-    };
-    // Not mirrored at 0, 270 and 360: the first column is full, one hit for each of 40 lines.
-    for (const double dfHeading : {0.0, 270.0, 360.0})
-    {
-        EXPECT_EQ(oFirstColumnHits(dfHeading), 40U) << dfHeading;
+        EXPECT_GE(oOut.mnSarpix, 40) << dfHeading;
+        EXPECT_EQ(nFirst == 0, !bMirrored) << dfHeading;
+        EXPECT_EQ(nLast == 0, bMirrored) << dfHeading;
     }
-    // Mirrored: the last column takes column 0 of the line that was hit after it.
-    EXPECT_EQ(oLastColumnHits(180.0), 39U);
+}
+
+// Column 0 of a mirrored line is the last counter of the buffer row before, which belongs to the
+// line that was hit before; that of the first buffer row is lost.
+TEST(SarSim1, ColumnZeroOfAMirroredLineBelongsToTheLineHitBefore)
+{
+    MemoryDataset oDem = DemOf<std::int16_t>(40, 40, kSeaLevel);
+    SimulationInput oInput = InputFor(oDem);
+    oInput.Oversamp = {1};
+    oInput.Head = {180.0};
+    const RadarReference oOut = Simulated(oDem, oInput);
+    ASSERT_EQ(oOut.mnSarpix, 40);
+    ASSERT_EQ(oOut.mnSarlin, 40);
+    EXPECT_EQ(Sum(oOut.mvnImage), 1600U - 1U);
+    // Rows run upwards, so line 40 is hit first: its last pixel is column 0 of line 39, and so on.
+    for (std::size_t y = 0; y < 40; ++y)
+    {
+        EXPECT_EQ(oOut.mvnImage[40 * y + 39], y == 0 ? 0 : 1) << y;
+    }
 }
 
 TEST(SarSim1, ExactlyEightHundredKilometresTakeTheChord)
@@ -230,14 +258,14 @@ TEST(SarSim1, ExactlyEightHundredKilometresTakeTheChord)
     oInput.Head = {0.0};
     oInput.Alti = {800000.0};
     const SarSim1 oChord = Processed(oInput, oDem);
-    const double dfChord = GroundRange(oChord, 800000.0F, 0.0F, 90000.0, 0.0);
-    const double dfArc = GroundRange(oChord, 800000.5F, 0.0F, 90000.0, 0.0);
-    // Two points of the swath's ends; the chord over 97000 m is 97000^3 / (24 R^2), 0.9 m, shorter
-    // than the arc.
-    EXPECT_NEAR(GroundRange(oChord, 800000.0F, 0.0F, 97000.0 + 30.0, 0.0) -
-                    GroundRange(oChord, 800000.0F, 0.0F, 30.0, 0.0),
-                2.0 * 6370000.0 * std::sin(97000.0 / 6370000.0 / 2.0), 0.5);
-    EXPECT_GT(std::fabs(dfChord - dfArc), 1.0);
+    // The far end of the swath: 97000 m along the sphere from the near range point, which lies
+    // 20030 m west of the central meridian.
+    constexpr double R = 6370000.0;
+    const double dfX = R * std::tan(std::atan(-20030.0 / R) + 97000.0 / R) + 20030.0;
+    EXPECT_NEAR(GroundRange(oChord, 800000.0F, 0.0F, 0.0, 0.0), 0.0, 1e-3);
+    EXPECT_NEAR(GroundRange(oChord, 800000.0F, 0.0F, dfX, 0.0), 2.0 * R * std::sin(48500.0 / R),
+                1e-3);
+    EXPECT_NEAR(GroundRange(oChord, 800000.5F, 0.0F, dfX, 0.0), 97000.0, 1e-3);
     EXPECT_TRUE(SameAsReference<std::int16_t>(oDem, oInput));
     oInput.Alti = {800000.5};
     EXPECT_TRUE(SameAsReference<std::int16_t>(oDem, oInput));
@@ -305,11 +333,11 @@ TEST(SarSim1, ACounterWrapsAt65536)
 
 TEST(SarSim1, UsesBufferRowsAgainBeyondTenThousandLines)
 {
-    MemoryDataset oDem = DemOf<std::int16_t>(2, 11, kFlat);
+    MemoryDataset oDem = DemOf<std::int16_t>(2, 1001, kFlat);
     SimulationInput oInput = InputFor(oDem);
     oInput.Head = {0.0};
-    oInput.Outputxsz = {300.0, 0.02};  // 300 m of 0.02 m
-    oInput.Oversamp = {1500};
+    oInput.Outputxsz = {300.0, 2.0};  // 30000 m of 2 m
+    oInput.Oversamp = {15};
     const RadarReference oOut = Simulated(oDem, oInput);
     EXPECT_EQ(oOut.mnSarlin, 15001);
     EXPECT_TRUE(SameAsReference<std::int16_t>(oDem, oInput));
@@ -374,17 +402,16 @@ TEST(SarSim1, ScansTheFirstRowToItselfWhenItsLastSampleIsBackground)
     oInput.Backelev = {-1.0};
     EXPECT_EQ(Sum(Simulated(oDem, oInput).mvnImage), 12U);
     oDem.Sample<std::int16_t>(1, 3, 0) = -1;
-    // The first row's three cells, of which the last is skipped; then one row of three and one of
-    // eight, all of which count. Those of the first row lie a line before the image.
-    EXPECT_EQ(Sum(Simulated(oDem, oInput).mvnImage),
-              Sum(SimulateRadar(oInput, test::ShortsOf<std::int16_t>(oDem), false).mvnImage));
+    // Two cells of one sub-sample, the third being skipped: they lie one line behind the last,
+    // which is dropped. Their fourth neighbour in the second row now is a slope down to -1.
+    EXPECT_EQ(Sum(Simulated(oDem, oInput).mvnImage), 12U);
     EXPECT_TRUE(SameAsReference<std::int16_t>(oDem, oInput));
 }
 
 // The sample tested stands to the right of the cell's first column, in both scan directions.
 TEST(SarSim1, SkipsTheCellLeftOfABackgroundSample)
 {
-    MemoryDataset oDem = DemOf<std::int16_t>(4, 2, kFlat);
+    MemoryDataset oDem = DemOf<std::int16_t>(4, 2, kSeaLevel);
     SimulationInput oInput = InputFor(oDem);
     oInput.Oversamp = {1};
     oInput.Backelev = {-1.0};
@@ -396,6 +423,7 @@ TEST(SarSim1, SkipsTheCellLeftOfABackgroundSample)
     // From right to left, the first cell's test reads the dataset's sample behind the window.
     MemoryDataset oWider = DemOf<std::int16_t>(5, 2, kFlat);
     oInput = InputFor(oWider);
+    oInput.Escale = {1.0, -100.0};  // at 0 m, far from the image's ends
     oInput.Dbiw = {0, 0, 4, 2};
     oInput.Oversamp = {1};
     oInput.Backelev = {-1.0};
@@ -424,8 +452,8 @@ TEST(SarSim1, DescribesWhatItWrites)
     MemoryDataset oDem = Hills(12, 12, 10);
     const SarSim1 oSimulator = Processed(InputFor(oDem), oDem);
     const test::TemporaryDirectory oFolder;
-    const test::Kordsk poDataset = test::NewKordsk(oFolder.File("radar.kordsk"));
-    oSimulator.Output(poDataset.get());
+    oSimulator.Output(oFolder.File("radar.kordsk"));
+    const test::Kordsk poDataset = test::OpenKordsk(oFolder.File("radar.kordsk"));
     EXPECT_EQ(poDataset->GetAuxiliaryData().GetChannelDescription(1),
               "Simulated SAR image: range/azimuth projection");
     EXPECT_EQ(poDataset->GetBitmapAuxiliaryData(1).GetChannelDescription(1),
@@ -520,24 +548,23 @@ TEST(SarSim1, RefusesImagesThatCannotBe)
 
 TEST(SarSim1, APlainIsUniformWithoutLayoverAndShadow)
 {
-    MemoryDataset oDem = DemOf<std::int16_t>(60, 60, kFlat);
+    MemoryDataset oDem = DemOf<std::int16_t>(60, 60, kSeaLevel);
     SimulationInput oInput = InputFor(oDem);
-    oInput.Escale = {1.0, -100.0};
     oInput.Head = {0.0};
     oInput.Oversamp = {4};
-    oInput.Outputxsz = {30.0, 30.0};
     const RadarReference oOut = Simulated(oDem, oInput);
     EXPECT_EQ(std::count(oOut.mvnLayover.begin(), oOut.mvnLayover.end(), 1), 0);
     EXPECT_EQ(std::count(oOut.mvnShadow.begin(), oOut.mvnShadow.end(), 1), 0);
-    for (int y = 2; y < oOut.mnSarlin - 2; ++y)
+    ASSERT_EQ(oOut.mnSarpix, 60);
+    ASSERT_EQ(oOut.mnSarlin, 60);
+    for (int y = 1; y < 59; ++y)
     {
-        for (int x = 2; x < oOut.mnSarpix - 2; ++x)
+        for (int x = 1; x < 59; ++x)
         {
-            // Sub-samples lie 7.5 m apart, so that a cell border shifts by one at most in each
-            // axis.
-            const int nCount = oOut.mvnImage[static_cast<std::size_t>(y * oOut.mnSarpix + x)];
-            EXPECT_GE(nCount, 3 * 3) << x << ' ' << y;
-            EXPECT_LE(nCount, 5 * 5) << x << ' ' << y;
+            // 4 x 4 sub-samples; the curvature moves one border of columns at most by one of them.
+            const int nCount = oOut.mvnImage[static_cast<std::size_t>(y * 60 + x)];
+            EXPECT_EQ(nCount % 4, 0) << x << ' ' << y;
+            EXPECT_NEAR(nCount, 16, 4) << x << ' ' << y;
         }
     }
 }
