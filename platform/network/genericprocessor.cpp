@@ -60,6 +60,10 @@ std::uint64_t GenericProcessor::Add(const boost::function<boost::any(boost::any&
                                     const std::vector<std::uint64_t>& oInputs,
                                     const std::string& oDescription)
 {
+    if (oFunction.empty())
+    {
+        throw Exception("oFunction is empty", kSource, __PRETTY_FUNCTION__, __LINE__);
+    }
     Entry oEntry;
     oEntry.moNode.moFunction = oFunction;
     oEntry.moNode.moInputs = oInputs;

@@ -60,7 +60,7 @@ public:
     std::uint64_t AddValue(const boost::any& oValue, const std::string& oDescription = "");
     /// A node that reads those of oInputs, which may be added later. Its function gets the result
     /// itself where there is one input, else a vector of boost::reference_wrapper<boost::any>.
-    /// Returns its id.
+    /// Returns its id. Throws kor::Exception for an empty function.
     std::uint64_t Add(const boost::function<boost::any(boost::any&)>& oFunction,
                       const std::vector<std::uint64_t>& oInputs, const std::string& oDescription);
 

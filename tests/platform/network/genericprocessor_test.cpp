@@ -160,6 +160,14 @@ TEST(GenericProcessor, RefusesMissingNodesAndCyclesBeforeAnythingRuns)
     EXPECT_EQ(nCalls, 0);
 }
 
+TEST(GenericProcessor, RefusesAnEmptyFunction)
+{
+    GenericProcessor oProcessor;
+    EXPECT_EQ(test::MessageOf<Exception>([&] { oProcessor.Add({}, {}, "nothing"); }),
+              "oFunction is empty");
+    EXPECT_EQ(oProcessor.GetNodeCount(), 0U);
+}
+
 TEST(GenericProcessor, ReadsNodesThatAreAddedLater)
 {
     GenericProcessor oProcessor;

@@ -48,7 +48,7 @@ struct Network
 };
 
 template <class T>
-RasterPointer RasterOf(const Image<T>& oImage)
+RasterPointer SharedRaster(const Image<T>& oImage)
 {
     return test::RasterOf(oImage, {1, 1});
 }
@@ -61,7 +61,7 @@ Image<T> Picture()
 
 TEST(AddAverageFilter, TakesOneNodeForDoubles)
 {
-    Network oNetwork(RasterOf(Picture<double>()));
+    Network oNetwork(SharedRaster(Picture<double>()));
     const auto nLast = oNetwork.Add(3, 3, tessel::eDT_64R, kUnspecified);
     EXPECT_EQ(oNetwork.moProcessor.GetNodeCount(), 4U);
     EXPECT_EQ(nLast, 3U);
@@ -73,7 +73,7 @@ TEST(AddAverageFilter, TakesOneNodeForDoubles)
 
 TEST(AddAverageFilter, ConvertsToDoubleAndBack)
 {
-    Network oNetwork(RasterOf(Picture<unsigned char>()));
+    Network oNetwork(SharedRaster(Picture<unsigned char>()));
     const auto nLast = oNetwork.Add(3, 3, tessel::eDT_8U, kUnspecified);
     EXPECT_EQ(oNetwork.moProcessor.GetNodeCount(), 6U);
     EXPECT_EQ(oNetwork.moProcessor.GetNode(nLast - 2).moDescription, "Convert to double");
@@ -85,7 +85,7 @@ TEST(AddAverageFilter, ConvertsToDoubleAndBack)
 
 TEST(AddAverageFilter, LeavesDoublesWhereTheyAreWanted)
 {
-    Network oNetwork(RasterOf(Picture<unsigned short>()));
+    Network oNetwork(SharedRaster(Picture<unsigned short>()));
     const auto nLast = oNetwork.Add(3, 1, tessel::eDT_16U, tessel::eDT_64R);
     EXPECT_EQ(oNetwork.moProcessor.GetNodeCount(), 5U);
     EXPECT_EQ(test::ImageOf<double>(*oNetwork.Result(nLast)), (Image<double>{{6, 7}}));
@@ -100,7 +100,7 @@ TEST(AddAverageFilter, DescribesItsWindow)
 
 TEST(AddAverageFilter, PassesTheMasksAndTheBackground)
 {
-    Network oNetwork(RasterOf(Picture<double>()));
+    Network oNetwork(SharedRaster(Picture<double>()));
     const auto oMask = [&](const Image<int>& oImage) {
         return oNetwork.moProcessor.AddValue(MaskPointer(test::MaskOf(oImage, {1, 1})));
     };
@@ -115,7 +115,7 @@ TEST(AddAverageFilter, PassesTheMasksAndTheBackground)
 
 TEST(AddAverageFilter, RefusesARasterInPlaceOfAMask)
 {
-    Network oNetwork(RasterOf(Picture<double>()));
+    Network oNetwork(SharedRaster(Picture<double>()));
     const auto oMessage = [&]
     {
         const auto nLast = oNetwork.Add(3, 3, tessel::eDT_64R, kUnspecified);
@@ -135,7 +135,7 @@ TEST(AddAverageFilter, RefusesARasterInPlaceOfAMask)
 TEST(AddAverageFilter, RunsSeveralFiltersOnOneRasterSideBySide)
 {
     const test::Image<float> oImage = {{1, 2, 3, 4}, {5, 6, 7, 8}, {9, 10, 11, 30}};
-    Network oNetwork(RasterOf(oImage));
+    Network oNetwork(SharedRaster(oImage));
     const auto nSquare = oNetwork.Add(3, 3, tessel::eDT_32R, kUnspecified);
     const auto nRow = oNetwork.Add(3, 1, tessel::eDT_32R, kUnspecified);
     EXPECT_EQ(test::ImageOf<float>(*oNetwork.Result(nSquare)), (Image<float>{{6, 9}}));
@@ -144,7 +144,7 @@ TEST(AddAverageFilter, RunsSeveralFiltersOnOneRasterSideBySide)
 
 TEST(ConvertRasterTo, KeepsMarginsAndOffsetsAndTakesNull)
 {
-    const RasterPointer poIn = RasterOf(Picture<short>());
+    const RasterPointer poIn = SharedRaster(Picture<short>());
     poIn->mnOffsetX = 11;
     poIn->mnOffsetY = 12;
     const RasterPointer poOut = ConvertRasterTo<double, 0>()(poIn);
@@ -160,7 +160,7 @@ TEST(ConvertRasterTo, KeepsMarginsAndOffsetsAndTakesNull)
 
 TEST(ConvertRasterToType, TakesItsTargetWhenItIsMadeAndRefusesNull)
 {
-    const RasterPointer poIn = RasterOf(Image<double>{{0, 0, 0}, {0, 1e9, 0}, {0, 0, 0}});
+    const RasterPointer poIn = SharedRaster(Image<double>{{0, 0, 0}, {0, 1e9, 0}, {0, 0, 0}});
     const RasterPointer poOut = ConvertRasterToType(tessel::eDT_16S)(poIn);
     EXPECT_EQ(test::ImageOf<short>(*poOut), (Image<short>{{32767}}));
     EXPECT_EQ(test::MessageOf<Exception>([] { ConvertRasterToType(tessel::eDT_8U)(nullptr); }),
