@@ -278,8 +278,8 @@ TEST(Sarsim2, CountsLinesOfPassTwoInPixelsAlongX)
     EXPECT_EQ(oActual, oExpected);
 }
 
-// Looking south at a heading of 90, a row is one metre further from the near range point and not one
-// pixel: all rows look at nearly the same radar column, inside the image.
+// Looking south at a heading of 90, a row is one metre further from the near range point and not
+// one pixel: all rows look at nearly the same radar column, inside the image.
 TEST(Sarsim2, RowsOfPassTwoLieOneMetreApart)
 {
     MemoryDataset oDem = DemOf<std::int16_t>(8, 8, kSeaLevel);
