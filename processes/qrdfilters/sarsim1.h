@@ -30,8 +30,8 @@ public:
     /// The DEM window in pixels of its dataset: x offset, y offset, width, height.
     void SetDbiw(std::vector<int> vnDbiw) { Dbiw = std::move(vnDbiw); }
     /// Scale and offset: an elevation in metres is (sample + offset) * scale, both cut to 16-bit
-    /// integers, and the result too. An offset of 0 puts the lowest sampled elevation to 0 (not for
-    /// 8-bit DEMs).
+    /// integers, and the result too. Meant: an offset of exactly 0 is replaced by the lowest
+    /// sample found, which is added (not for 8-bit DEMs).
     void SetEscale(std::vector<double> vdfEscale) { Escale = std::move(vdfEscale); }
     /// The sample that marks pixels without an elevation.
     void SetBackelev(std::vector<double> vdfBackelev) { Backelev = std::move(vdfBackelev); }

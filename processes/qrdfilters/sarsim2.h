@@ -29,8 +29,8 @@ public:
 
     /// The DEM window in pixels of its dataset: x offset, y offset, width, height.
     void SetDbiw(std::vector<unsigned int> vnDbiw) { Dbiw = std::move(vnDbiw); }
-    /// Scale and offset: an elevation in metres is (sample + offset) * scale. An offset of 0 puts
-    /// the lowest sampled elevation to 0 (not for 8-bit DEMs).
+    /// Scale and offset: an elevation in metres is (sample + offset) * scale. Meant: an offset
+    /// of exactly 0 is replaced by the lowest sample found, which is added (not for 8-bit DEMs).
     void SetEscale(std::vector<double> vdfEscale) { Escale = std::move(vdfEscale); }
     /// Altitude of the sensor above the sphere, metres. Exactly 800000 is special, see SarSim1.
     void SetAlti(std::vector<double> vdfAlti) { Alti = std::move(vdfAlti); }
