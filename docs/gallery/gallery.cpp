@@ -18,7 +18,9 @@ constexpr const char* kUsage =
     "gallery radar FILE CHANNEL FOLDER    speckle on a crop of a file: pictures to FOLDER, tables\n"
     "                                     of how the radar filters do on it and on a made scene\n"
     "gallery measure FILE CHANNEL LOOKS   the radar table for an image as it is, of intensities\n"
-    "gallery spatial FILE CHANNEL FOLDER  pictures of the spatial filters on a crop of a file\n";
+    "gallery spatial FILE CHANNEL FOLDER  pictures of the spatial filters on a crop of a file\n"
+    "gallery simulation FILE FOLDER       a DEM as a radar sees it: pictures to FOLDER, a table\n"
+    "                                     of layover and shadow\n";
 
 using Words = std::vector<std::string>;
 
@@ -48,6 +50,7 @@ const std::map<std::string, Job>& Jobs()
          {3, [](const Words& o) { MakeSpatialPage(o[0], ChannelOf(o[1]), Folder(o[2])); }}},
         {"measure",
          {3, [](const Words& o) { MeasureRadarImage(o[0], ChannelOf(o[1]), std::stoi(o[2])); }}},
+        {"simulation", {2, [](const Words& o) { MakeSimulationPage(o[0], Folder(o[1])); }}},
     };
     return oJobs;
 }

@@ -17,4 +17,8 @@ void MeasureRadarImage(const std::string& oFile, unsigned int nChannel, int nLoo
 void MakeSpatialPage(const std::string& oFile, unsigned int nChannel,
                      const std::filesystem::path& oFolder);
 
+/// A DEM as a radar sees it, from four headings and under two look angles: pictures to oFolder, a
+/// table of what lies in layover and shadow.
+void MakeSimulationPage(const std::string& oFile, const std::filesystem::path& oFolder);
+
 }  // namespace kor::gallery
