@@ -13,10 +13,10 @@ fetch_elevations()
     fi
     mkdir -p $elevations_folder
     (
-        cd $elevations_folder
-        apt-get -q -o APT::Sandbox::User=root download $elevations_package
-        dpkg-deb -x $elevations_package*.deb .
-        unzip -oq usr/share/matplotlib/mpl-data/sample_data/jacksboro_fault_dem.npz elevation.npy
+        cd $elevations_folder &&
+            apt-get -q -o APT::Sandbox::User=root download $elevations_package &&
+            dpkg-deb -x $elevations_package*.deb . &&
+            unzip -oq usr/share/matplotlib/mpl-data/sample_data/jacksboro_fault_dem.npz elevation.npy
     ) || fail "The elevations could not be downloaded (Debian package $elevations_package, see above)."
     # 80 bytes of the file's own header stand before the samples.
     printf '%s\n' ENVI "samples = 403" "lines = 344" "bands = 1" "header offset = 80" \

@@ -187,7 +187,7 @@ void MakeSimulationPage(const std::string& oFile, const std::filesystem::path& o
     for (const int nHeading : {0, 180})
     {
         WriteMarked((oFolder / ("map_" + std::to_string(nHeading) + ".png")).string(),
-                    OnTheMap(oDem, nHeading, 15), {0.0, 2.0 * kFlat});
+                    OnTheMap(oDem, nHeading, 23), {0.0, 2.0 * kFlat});
     }
 }
 
