@@ -3,6 +3,7 @@
 declare -A PACKAGES=(
     [build]="g++ cmake ninja-build libboost-dev libhwy-dev libgdal-dev"
     [test]="libgtest-dev"
+    [docs]="unzip"
     [bench]="libbenchmark-dev"
     [files]="time gdal-bin"
     [peers]="python3-numpy python3-scipy python3-opencv"

@@ -20,7 +20,9 @@ constexpr const char* kUsage =
     "gallery measure FILE CHANNEL LOOKS   the radar table for an image as it is, of intensities\n"
     "gallery spatial FILE CHANNEL FOLDER  pictures of the spatial filters on a crop of a file\n"
     "gallery transforms FILE FOLDER       principal components of a file of six bands and classes\n"
-    "                                     made of them: pictures to FOLDER, the analysis\n";
+    "                                     made of them: pictures to FOLDER, the analysis\n"
+    "gallery simulation FILE FOLDER       a DEM as a radar sees it: pictures to FOLDER, a table\n"
+    "                                     of layover and shadow\n";
 
 using Words = std::vector<std::string>;
 
@@ -51,6 +53,7 @@ const std::map<std::string, Job>& Jobs()
         {"measure",
          {3, [](const Words& o) { MeasureRadarImage(o[0], ChannelOf(o[1]), std::stoi(o[2])); }}},
         {"transforms", {2, [](const Words& o) { MakeTransformsPage(o[0], Folder(o[1])); }}},
+        {"simulation", {2, [](const Words& o) { MakeSimulationPage(o[0], Folder(o[1])); }}},
     };
     return oJobs;
 }

@@ -20,4 +20,8 @@ void MakeSpatialPage(const std::string& oFile, unsigned int nChannel,
 /// report of the analysis.
 void MakeTransformsPage(const std::string& oFile, const std::filesystem::path& oFolder);
 
+/// A DEM as a radar sees it, from four headings and under two look angles: pictures to oFolder, a
+/// table of what lies in layover and shadow.
+void MakeSimulationPage(const std::string& oFile, const std::filesystem::path& oFolder);
+
 }  // namespace kor::gallery

@@ -1,0 +1,72 @@
+#pragma once
+
+#include <cmath>
+#include <limits>
+#include <span>
+#include <vector>
+
+#include "processes/qrdfilters/simulation/projection.h"
+#include "processes/qrdfilters/simulation/scanframe.h"
+
+namespace kor::filters::simulation
+{
+
+/// Finds the columns of the radar image in which rows of terrain points lie. What depends on the
+/// place of a point in its row alone is kept in tables.
+template <Division kDivision>
+class RangeColumns
+{
+public:
+    RangeColumns(const Projection<kDivision>& oProjection, const RadarGrid& oGrid)
+        : moProjection(oProjection), moGrid(oGrid)
+    {
+    }
+
+    /// One more place: dfX metres east of the window's left edge.
+    void Append(double dfX)
+    {
+        const double dfTerm = moProjection.ColumnTerm(dfX);
+        mvdfTerms.push_back(dfTerm);
+        if (moProjection.IsMeridional())
+        {
+            mvdfCosines.push_back(std::cos(moProjection.EarthAngle(dfTerm, 0.0)));
+        }
+    }
+
+    /// Of a point at one of the places, dfNorth metres north of the near range point.
+    Ranges RangesOf(std::size_t nPlace, double dfNorth, double dfElevation) const
+    {
+        const double dfCosine = moProjection.IsMeridional()
+                                    ? mvdfCosines[nPlace]
+                                    : std::cos(moProjection.EarthAngle(mvdfTerms[nPlace], dfNorth));
+        const double dfSlant = moProjection.SlantRange(dfCosine, dfElevation);
+        return {dfSlant, moProjection.GroundRange(dfSlant)};
+    }
+
+    /// Columns count from 1 in the image; others lie outside.
+    std::int64_t ColumnOf(double dfGround) const
+    {
+        const std::int64_t nColumn =
+            Truncated((dfGround - moGrid.mdfNearRange) * moGrid.mdfPerRange + 1.0 + 0.5);
+        return moGrid.mbMirror ? moGrid.mnPixels - nColumn : nColumn;
+    }
+
+    /// Of points at the places from nFirst on.
+    void Find(std::size_t nFirst, double dfNorth, std::span<const double> oElevations,
+              std::span<Ranges> oRanges, std::span<std::int64_t> oColumns) const
+    {
+        for (std::size_t k = 0; k < oElevations.size(); ++k)
+        {
+            oRanges[k] = RangesOf(nFirst + k, dfNorth, oElevations[k]);
+            oColumns[k] = ColumnOf(oRanges[k].mdfGround);
+        }
+    }
+
+private:
+    Projection<kDivision> moProjection;
+    RadarGrid moGrid;
+    std::vector<double> mvdfTerms;
+    std::vector<double> mvdfCosines;  ///< of the earth central angle, where places tell it
+};
+
+}  // namespace kor::filters::simulation
