@@ -12,9 +12,9 @@
 #include "platform/system/translate.h"
 #include "processes/qrdfilters/blockcontract.h"
 #include "processes/qrdfilters/cutsample.h"
-#include "processes/qrdfilters/greylevels.h"
 #include "processes/qrdfilters/kernels/greypairs.h"
 #include "processes/qrdfilters/samplerows.h"
+#include "processes/qrdfilters/texture/greylevels.h"
 
 namespace kor::filters
 {

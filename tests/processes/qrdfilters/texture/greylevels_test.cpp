@@ -1,4 +1,4 @@
-#include "processes/qrdfilters/greylevels.h"
+#include "processes/qrdfilters/texture/greylevels.h"
 
 #include <gtest/gtest.h>
 
