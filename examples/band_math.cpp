@@ -20,6 +20,7 @@
 
 #include "examples/filterfile/arguments.h"
 #include "examples/filterfile/outputfile.h"
+#include "examples/filterfile/program.h"
 #include "examples/filterfile/terminal.h"
 #include "platform/datasources/basicwriter.h"
 #include "platform/datasources/datasetmanager.h"
@@ -38,10 +39,6 @@ using examples::Arguments;
 using examples::UsageError;
 using tessel::Mask;
 using tessel::Raster;
-
-constexpr int kFailed = 1;
-constexpr int kMisused = 2;
-constexpr int kInterrupted = 130;
 
 constexpr double kMost = std::numeric_limits<float>::max();
 
@@ -289,10 +286,7 @@ using Driver =
 void RunOver(Driver& oDriver, const Bands& oBands, datasources::IRasterWriter* poWriter)
 {
     oDriver.Run(&oBands.GetReader(), poWriter);
-    if (examples::IsInterrupted())
-    {
-        throw examples::Interrupted();
-    }
+    examples::EndIfInterrupted();
 }
 
 /// Describes the output, which has one channel.
@@ -379,30 +373,12 @@ void ComputeFile(const std::string& oIn, const std::string& oOut, const std::str
 int main(int nArguments, char* apszArguments[])
 {
     const std::span<char*> oWords(apszArguments, static_cast<std::size_t>(nArguments));
-    if (nArguments < 4)
+    if (oWords.size() < 4)
     {
         std::cerr << kUsage;
-        return kMisused;
+        return examples::kMisused;
     }
-    try
-    {
-        examples::CatchInterrupts();
-        ComputeFile(oWords[1], oWords[2], oWords[3], Arguments(oWords.subspan(4)));
-        return 0;
-    }
-    catch (const UsageError& oError)
-    {
-        std::cerr << "band_math: " << oError.what() << '\n';
-        return kMisused;
-    }
-    catch (const examples::Interrupted&)
-    {
-        std::cerr << "band_math: interrupted; " << oWords[2] << " was not made\n";
-        return kInterrupted;
-    }
-    catch (const std::exception& oError)
-    {
-        std::cerr << "band_math: " << oError.what() << '\n';
-        return kFailed;
-    }
+    return examples::RunProgram(
+        "band_math", oWords[2],
+        [&] { ComputeFile(oWords[1], oWords[2], oWords[3], Arguments(oWords.subspan(4))); });
 }

@@ -23,6 +23,7 @@
 #include "examples/filterfile/filtertable.h"
 #include "examples/filterfile/names.h"
 #include "examples/filterfile/outputfile.h"
+#include "examples/filterfile/program.h"
 #include "examples/filterfile/stripreader.h"
 #include "examples/filterfile/terminal.h"
 #include "platform/datasources/basicreader.h"
@@ -44,10 +45,6 @@ using examples::PreparedFilter;
 using examples::TypeName;
 using tessel::DataType;
 using tessel::RasterInfo;
-
-constexpr int kFailed = 1;
-constexpr int kMisused = 2;
-constexpr int kInterrupted = 130;
 
 constexpr const char* kUsage =
     "Usage: filter_file IN OUT FILTER key=value ...\n"
@@ -245,10 +242,7 @@ public:
         parallelio::FilterDriver<examples::TerminalStatus> oDriver(moFilter.moAlgorithm);
         oDriver.SetMemoryBudget(mnBudget);
         oDriver.Run(&moSource.GetReader(), nullptr);
-        if (examples::IsInterrupted())
-        {
-            throw examples::Interrupted();
-        }
+        examples::EndIfInterrupted();
     }
 
 private:
@@ -349,8 +343,8 @@ std::uint64_t SplitMemory(int nMegabytes)
     return static_cast<std::uint64_t>(nMegabytes - nCache) << 20;
 }
 
-int FilterFile(const std::string& oIn, const std::string& oOut, const std::string& oName,
-               Arguments oArguments)
+void FilterFile(const std::string& oIn, const std::string& oOut, const std::string& oName,
+                Arguments oArguments)
 {
     const examples::FilterEntry& oEntry = examples::FindFilter(oName);
     const std::uint64_t nBudget =
@@ -384,15 +378,11 @@ int FilterFile(const std::string& oIn, const std::string& oOut, const std::strin
         oDriver.Run(&oSource.GetReader(), &oWriter);
         oTimes = oDriver.GetTimes();
     }
-    if (examples::IsInterrupted())
-    {
-        throw examples::Interrupted();
-    }
+    examples::EndIfInterrupted();
     const auto oClosing = std::chrono::steady_clock::now();
     oFile.Finish();
     const std::chrono::duration<double> oClosed = std::chrono::steady_clock::now() - oClosing;
     PrintReport(oName, oSource.GetInfo(), oInfo, oTimes, oClosed.count());
-    return 0;
 }
 
 }  // namespace
@@ -400,35 +390,18 @@ int FilterFile(const std::string& oIn, const std::string& oOut, const std::strin
 int main(int nArguments, char* apszArguments[])
 {
     const std::span<char*> oWords(apszArguments, static_cast<std::size_t>(nArguments));
-    try
+    if (oWords.size() == 3 && std::string(oWords[1]) == "help")
     {
-        if (nArguments == 3 && std::string(oWords[1]) == "help")
-        {
-            PrintHelp(examples::FindFilter(oWords[2]));
-            return 0;
-        }
-        if (nArguments < 4)
-        {
-            PrintUsage(std::cerr);
-            return kMisused;
-        }
-        examples::CatchInterrupts();
-        KeepNoFreedBlocks();
-        return FilterFile(oWords[1], oWords[2], oWords[3], Arguments(oWords.subspan(4)));
+        return examples::RunProgram("filter_file", "",
+                                    [&] { PrintHelp(examples::FindFilter(oWords[2])); });
     }
-    catch (const examples::UsageError& oError)
+    if (oWords.size() < 4)
     {
-        std::cerr << "filter_file: " << oError.what() << '\n';
-        return kMisused;
+        PrintUsage(std::cerr);
+        return examples::kMisused;
     }
-    catch (const std::exception& oError)
-    {
-        if (examples::IsInterrupted())  // whatever became of that on its way here
-        {
-            std::cerr << "filter_file: interrupted; " << oWords[2] << " was not made\n";
-            return kInterrupted;
-        }
-        std::cerr << "filter_file: " << oError.what() << '\n';
-        return kFailed;
-    }
+    KeepNoFreedBlocks();
+    return examples::RunProgram(
+        "filter_file", oWords[2],
+        [&] { FilterFile(oWords[1], oWords[2], oWords[3], Arguments(oWords.subspan(4))); });
 }

@@ -17,6 +17,7 @@
 #include "examples/filterfile/classvalues.h"
 #include "examples/filterfile/names.h"
 #include "examples/filterfile/outputfile.h"
+#include "examples/filterfile/program.h"
 #include "examples/filterfile/terminal.h"
 #include "platform/datasources/basicreader.h"
 #include "platform/datasources/basicwriter.h"
@@ -31,10 +32,6 @@ using namespace kor;
 using examples::Arguments;
 using examples::OutputFile;
 using tessel::DataType;
-
-constexpr int kFailed = 1;
-constexpr int kMisused = 2;
-constexpr int kInterrupted = 130;
 
 constexpr const char* kUsage =
     "Usage: homogenise IN OUT key=value ...\n"
@@ -56,7 +53,7 @@ unsigned int RequireChannel(const std::string& oKey, unsigned int nChannel, unsi
     return nChannel;
 }
 
-int Homogenise(const std::string& oIn, const std::string& oOut, Arguments oArguments)
+void Homogenise(const std::string& oIn, const std::string& oOut, Arguments oArguments)
 {
     datasources::RegisterGdalDriver();
     const std::unique_ptr<datasources::IDataset> poInput(
@@ -93,38 +90,21 @@ int Homogenise(const std::string& oIn, const std::string& oOut, Arguments oArgum
         parallelio::FilterDriver<examples::TerminalStatus> oDriver(oAlgorithm);
         oDriver.Run(&oReader, &oWriter);
     }
-    if (examples::IsInterrupted())
-    {
-        std::cerr << "homogenise: interrupted; " << oOut << " was not made\n";
-        return kInterrupted;
-    }
+    examples::EndIfInterrupted();
     oFile.Finish();
-    return 0;
 }
 
 }  // namespace
 
 int main(int nArguments, char* apszArguments[])
 {
-    if (nArguments < 3)
+    const std::span<char*> oWords(apszArguments, static_cast<std::size_t>(nArguments));
+    if (oWords.size() < 3)
     {
         std::cerr << kUsage << examples::ClassValues::kParameters;
-        return kMisused;
+        return examples::kMisused;
     }
-    try
-    {
-        examples::CatchInterrupts();
-        const std::span<char*> oWords(apszArguments, static_cast<std::size_t>(nArguments));
-        return Homogenise(oWords[1], oWords[2], Arguments(oWords.subspan(3)));
-    }
-    catch (const examples::UsageError& oError)
-    {
-        std::cerr << "homogenise: " << oError.what() << '\n';
-        return kMisused;
-    }
-    catch (const std::exception& oError)
-    {
-        std::cerr << "homogenise: " << oError.what() << '\n';
-        return kFailed;
-    }
+    return examples::RunProgram(
+        "homogenise", oWords[2],
+        [&] { Homogenise(oWords[1], oWords[2], Arguments(oWords.subspan(3))); });
 }

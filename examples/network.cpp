@@ -14,6 +14,8 @@
 #include "basic/tessel/mask/mask.h"
 #include "examples/filterfile/arguments.h"
 #include "examples/filterfile/outputfile.h"
+#include "examples/filterfile/program.h"
+#include "examples/filterfile/terminal.h"
 #include "platform/datasources/basicreader.h"
 #include "platform/datasources/basicwriter.h"
 #include "platform/datasources/gdal/gdaldriver.h"
@@ -143,6 +145,7 @@ void RunNetwork(const std::string& oIn, const std::string& oOut, examples::Argum
         datasources::BasicWriter oWriter(&oFile.GetDataset(), {1});
         oWriter.WriteRaster(poDetail.get());
     }
+    examples::EndIfInterrupted();
     oFile.Finish();
 }
 
@@ -150,25 +153,13 @@ void RunNetwork(const std::string& oIn, const std::string& oOut, examples::Argum
 
 int main(int nArguments, char* apszArguments[])
 {
-    if (nArguments < 3)
+    const std::span<char*> oWords(apszArguments, static_cast<std::size_t>(nArguments));
+    if (oWords.size() < 3)
     {
         std::cerr << kUsage;
-        return 2;
+        return examples::kMisused;
     }
-    try
-    {
-        const std::span<char*> oWords(apszArguments, static_cast<std::size_t>(nArguments));
-        RunNetwork(oWords[1], oWords[2], examples::Arguments(oWords.subspan(3)));
-    }
-    catch (const examples::UsageError& oError)
-    {
-        std::cerr << "network: " << oError.what() << '\n';
-        return 2;
-    }
-    catch (const std::exception& oError)
-    {
-        std::cerr << "network: " << oError.what() << '\n';
-        return 1;
-    }
-    return 0;
+    return examples::RunProgram(
+        "network", oWords[2],
+        [&] { RunNetwork(oWords[1], oWords[2], examples::Arguments(oWords.subspan(3))); });
 }

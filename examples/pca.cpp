@@ -18,6 +18,7 @@
 #include "examples/filterfile/names.h"
 #include "examples/filterfile/outputfile.h"
 #include "examples/filterfile/principalcomponents.h"
+#include "examples/filterfile/program.h"
 #include "examples/filterfile/terminal.h"
 #include "platform/datasources/basicreader.h"
 #include "platform/datasources/basicwriter.h"
@@ -31,10 +32,6 @@ namespace
 using namespace kor;
 using examples::Arguments;
 using examples::OutputFile;
-
-constexpr int kFailed = 1;
-constexpr int kMisused = 2;
-constexpr int kInterrupted = 130;
 
 constexpr const char* kUsage =
     "Usage: pca IN OUT key=value ...\n"
@@ -67,7 +64,7 @@ void WarnOfMissingData(const datasources::IRasterReader& oReader)
     }
 }
 
-int Transform(const std::string& oIn, const std::string& oOut, Arguments oArguments)
+void Transform(const std::string& oIn, const std::string& oOut, Arguments oArguments)
 {
     datasources::RegisterGdalDriver();
     const std::unique_ptr<datasources::IDataset> poInput(
@@ -109,39 +106,21 @@ int Transform(const std::string& oIn, const std::string& oOut, Arguments oArgume
         parallelio::FilterDriver<examples::TerminalStatus> oDriver(oAlgorithm);
         oDriver.Run(&oReader, &oWriter);
     }
-    if (examples::IsInterrupted())
-    {
-        std::cerr << "pca: interrupted; " << oOut << " was not made\n";
-        return kInterrupted;
-    }
+    examples::EndIfInterrupted();
     oFile.Finish();
     oComponents.Print(pszMode);
-    return 0;
 }
 
 }  // namespace
 
 int main(int nArguments, char* apszArguments[])
 {
-    if (nArguments < 3)
+    const std::span<char*> oWords(apszArguments, static_cast<std::size_t>(nArguments));
+    if (oWords.size() < 3)
     {
         std::cerr << kUsage << examples::PrincipalComponents::kParameters;
-        return kMisused;
+        return examples::kMisused;
     }
-    try
-    {
-        examples::CatchInterrupts();
-        const std::span<char*> oWords(apszArguments, static_cast<std::size_t>(nArguments));
-        return Transform(oWords[1], oWords[2], Arguments(oWords.subspan(3)));
-    }
-    catch (const examples::UsageError& oError)
-    {
-        std::cerr << "pca: " << oError.what() << '\n';
-        return kMisused;
-    }
-    catch (const std::exception& oError)
-    {
-        std::cerr << "pca: " << oError.what() << '\n';
-        return kFailed;
-    }
+    return examples::RunProgram(
+        "pca", oWords[2], [&] { Transform(oWords[1], oWords[2], Arguments(oWords.subspan(3))); });
 }

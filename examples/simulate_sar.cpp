@@ -14,12 +14,12 @@
 #include <limits>
 #include <memory>
 #include <optional>
-#include <stdexcept>
 #include <string>
 #include <vector>
 
 #include "examples/filterfile/arguments.h"
 #include "examples/filterfile/outputfile.h"
+#include "examples/filterfile/program.h"
 #include "examples/filterfile/terminal.h"
 #include "platform/datasources/basicreader.h"
 #include "platform/datasources/basicwriter.h"
@@ -36,10 +36,6 @@ namespace
 using namespace kor;
 using examples::Arguments;
 using ogc::cs::GeocodingInfo;
-
-constexpr int kFailed = 1;
-constexpr int kMisused = 2;
-constexpr int kInterrupted = 130;
 
 constexpr const char* kUsage =
     "Usage: simulate_sar DEM OUT key=value ...\n"
@@ -63,13 +59,6 @@ constexpr const char* kUsage =
     "  format=           KORDSK or GDAL's name of a format; else by OUT's suffix\n"
     "  options=          of the format, such as \"TILED=YES COMPRESS=DEFLATE\"\n"
     "  replace=no        yes: an older OUT is replaced\n";
-
-/// Ends a run that the user does not want any more.
-class Interruption : public std::runtime_error
-{
-public:
-    Interruption() : std::runtime_error("interrupted") {}
-};
 
 /// What the user wants.
 struct View
@@ -167,7 +156,7 @@ public:
     {
         if (moStatus.IsCancelled())
         {
-            throw Interruption();
+            throw examples::Interrupted();
         }
         if (mbTellsRows)
         {
@@ -239,10 +228,7 @@ void SimulateMap(DemReader& oDem, const View& oView, datasources::IRasterDataset
                                 {oView.mdfAltitude}, {oView.mdfHeading}, {oView.mdfLook},
                                 oView.mvdfNear, {oView.mnOversampling}, &oProgress);
     oSimulator.Process(&oDem, &oCounts, &oLayover, &oShadow);
-    if (examples::IsInterrupted())
-    {
-        throw Interruption();
-    }
+    examples::EndIfInterrupted();
 }
 
 /// oScratch: a file that the image goes through, since its masks are bitmaps.
@@ -333,31 +319,13 @@ void Simulate(const std::string& oIn, const std::string& oOut, Arguments oArgume
 
 int main(int nArguments, char* apszArguments[])
 {
-    if (nArguments < 3)
+    const std::span<char*> oWords(apszArguments, static_cast<std::size_t>(nArguments));
+    if (oWords.size() < 3)
     {
         std::cerr << kUsage;
-        return kMisused;
+        return examples::kMisused;
     }
-    try
-    {
-        const std::span<char*> oWords(apszArguments, static_cast<std::size_t>(nArguments));
-        examples::CatchInterrupts();
-        Simulate(oWords[1], oWords[2], Arguments(oWords.subspan(3)));
-        return 0;
-    }
-    catch (const Interruption&)
-    {
-        std::cerr << "simulate_sar: interrupted; " << apszArguments[2] << " was not made\n";
-        return kInterrupted;
-    }
-    catch (const examples::UsageError& oError)
-    {
-        std::cerr << "simulate_sar: " << oError.what() << '\n';
-        return kMisused;
-    }
-    catch (const std::exception& oError)
-    {
-        std::cerr << "simulate_sar: " << oError.what() << '\n';
-        return kFailed;
-    }
+    return examples::RunProgram("simulate_sar", oWords[2],
+                                [&]
+                                { Simulate(oWords[1], oWords[2], Arguments(oWords.subspan(3))); });
 }

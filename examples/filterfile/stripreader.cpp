@@ -30,10 +30,7 @@ StripReader::StripReader(datasources::IRasterReader& oReader, std::uint64_t nMax
 
 void StripReader::ReadRaster(tessel::Raster* poRaster)
 {
-    if (IsInterrupted())
-    {
-        throw Interrupted();
-    }
+    EndIfInterrupted();
     moReader.ReadRaster(poRaster);
     moStatus.SetProgress(static_cast<float>(poRaster->mnOffsetY + poRaster->mnHeight) /
                          static_cast<float>(GetHeight()));

@@ -37,6 +37,14 @@ bool IsInterrupted()
     return bInterrupted;
 }
 
+void EndIfInterrupted()
+{
+    if (IsInterrupted())
+    {
+        throw Interrupted();
+    }
+}
+
 TerminalStatus::~TerminalStatus()
 {
     if (mnShown >= 0)

@@ -12,12 +12,15 @@ void CatchInterrupts();
 /// True when an end was asked for.
 bool IsInterrupted();
 
-/// Thrown to end what is under way when that is so.
+/// Ends what is under way when that is so.
 class Interrupted : public std::runtime_error
 {
 public:
     Interrupted() : std::runtime_error("interrupted") {}
 };
+
+/// Throws Interrupted when an end was asked for.
+void EndIfInterrupted();
 
 /// Shows the progress of a run on standard error where that is a terminal, and ends the run when it
 /// is asked for.
