@@ -158,6 +158,23 @@ TEST(FilterFefrost, BackgroundIsZeroOrTheInput)
               (Image<double>{{2, 2, 4}}));
 }
 
+TEST(FilterFefrost, BackgroundIsTheInputAtFirst)
+{
+    FilterFefrost oFilter;
+    oFilter.SetNLOOK(4);
+    oFilter.SetDamp(1);
+    const auto poMask = MaskOf({{1, 0, 1}}, Margins{1, 0});
+    EXPECT_EQ(Filtered(oFilter, {{1, 3, 2}}, poMask.get()), (Image<double>{{3}}));
+}
+
+// Without damping: the mean of all three, the clipped one among them.
+TEST(FilterFefrost, PixelsClippedFromTheOutputStillFeedTheirNeighbours)
+{
+    const auto poClip = MaskOf({{0, 1}});
+    EXPECT_EQ(Filtered(EnhancedFrost(4, 0, true), {{9, 3, 8, 19}}, nullptr, poClip.get()),
+              (Image<double>{{0, 10}}));
+}
+
 // No look at all makes both bounds infinite: every finite Ci lies below the lower one.
 TEST(FilterFefrost, ZeroLooksGiveTheMean)
 {

@@ -216,6 +216,11 @@ TEST(FilterFle, BackgroundIsZeroAtFirst)
     oFilter.SetBGZero(false);
     EXPECT_EQ(Filtered(oFilter, oImage, {1, 0}, poMask.get(), poClip.get()),
               (Image<double>{{4, 7, 4}}));
+    FilterFle oKeeping(false);
+    oKeeping.SetNoise("MULT");
+    oKeeping.SetNoiseVar({1.0});
+    EXPECT_EQ(Filtered(oKeeping, oImage, {1, 0}, poMask.get(), poClip.get()),
+              (Image<double>{{4, 7, 4}}));
 }
 
 TEST(FilterFle, RegularPathHalvesTheSizes)
@@ -546,8 +551,134 @@ TEST(FilterFle, SubBlockSumsGrowFromPixelToPixel)
     const Image<double> oBoth = Filtered(oFilter, oImage, {3, 3}, poMask.get());
     const Image<double> oAlone = Filtered(oFilter, oImage, {3, 3}, poMask.get(), poClip.get());
     EXPECT_NE(oAlone.Samples()[1], oBoth.Samples()[1]);
+    // A block that begins with the second pixel begins new sums too.
+    std::vector<double> vdfSecond(49, 2.0);
+    vdfSecond[23] = 51.0;
+    const auto poSecondMask = AllValid(1, 1, {3, 3});
+    EXPECT_EQ(FilteredCentre(oFilter, Image<double>(7, vdfSecond), poSecondMask.get()),
+              oAlone.Samples()[1]);
     // A call leaves nothing behind.
     EXPECT_EQ(Filtered(oFilter, oImage, {3, 3}, poMask.get()), oBoth);
+}
+
+// Both channels count alike, so that the second one's noise is that of the first one's sums
+// doubled: blocks 4 to 7 have sums 36, 134, 12, 8 and squares 72, 5266, 24, 16.
+TEST(FilterFle, SubBlockSumsGrowFromChannelToChannel)
+{
+    std::vector<double> vdfSamples(98, 2.0);
+    vdfSamples[48] = 51.0;
+    vdfSamples[49] = 51.0;
+    const auto poMask = AllValid(1, 1, {3, 3});
+    const Image<double> oOut = Filtered(Lee("ADDI", 0.0, 1.0), Image<double>(14, vdfSamples),
+                                        {3, 3}, poMask.get(), nullptr, 2);
+    const double v =
+        ((72.0 - 144.0) + (5266.0 - 17956.0 / 9.0) + (24.0 - 16.0) + (16.0 - 64.0 / 9.0)) / 8.0 /
+        5.0;
+    EXPECT_NEAR(oOut.Samples()[1], 48.0 * 47.0 / (47.0 + v) + 3.0, 1e-12);
+    EXPECT_EQ(oOut.Samples()[0], EnhancedOf7(Lee("ADDI", 0.0, 1.0), 2.0, 51.0));
+}
+
+// Samples of 2 with 83 in the middle of 9 x 9: mean = 243 / 81 = 3, var = (7209 - 729) / 81 - 1 =
+// 79. The blocks are the nine squares of 3 x 3 pixels; of those that count only number 4, in the
+// middle, is not flat: sum 99, squares 6921, variance (6921 - 1089) / 8 = 729.
+TEST(FilterFle, SubBlocksOf9PixelsAreSquares)
+{
+    std::vector<double> vdfSamples(81, 2.0);
+    vdfSamples[40] = 83.0;
+    const auto poMask = AllValid(1, 1, {4, 4});
+    EXPECT_DOUBLE_EQ(
+        FilteredCentre(Lee("ADDI", 0.0, 1.0), Image<double>(9, vdfSamples), poMask.get()),
+        80.0 * 79.0 / (79.0 + 729.0 / 5.0) + 3.0);
+}
+
+/// The noise that is estimated in 7 x 7 samples of 4 with 32 in the middle, which stands in block
+/// 5: its sum is 64, squares 1152; blocks 6 and 7 have three and two entries of 4, 4 is flat.
+double NoiseOfFours()
+{
+    return ((1152.0 - 4096.0 / 9.0) + (48.0 - 16.0) + (32.0 - 64.0 / 9.0)) / 8.0 / 5.0;
+}
+
+// All samples but the middle are 4, so that blocks 0 and 4 have one mean: the upper left triangle
+// counts, 28 entries with the middle among them. mean = 140 / 28 = 5, var = (1456 - 700) / 27 = 28.
+TEST(FilterFle, VarianceBelowTheThresholdTakesTheUpperLeftTriangle)
+{
+    EXPECT_DOUBLE_EQ(EnhancedOf7(Lee("ADDI", 0.0, 1000.0), 4.0, 32.0),
+                     27.0 * 28.0 / (28.0 + NoiseOfFours()) + 5.0);
+    // Nothing is estimated from a noise that is known, nor under the multiplicative model: mean
+    // 32 / 7 and var = (1792 - 1024) / 49 - 1 of the whole window.
+    const double dfVar = 719.0 / 49.0;
+    EXPECT_DOUBLE_EQ(EnhancedOf7(Lee("ADDI", 1.0, 1000.0), 4.0, 32.0),
+                     (32.0 - 32.0 / 7.0) * (dfVar / (dfVar + 1.0)) + 32.0 / 7.0);
+    EXPECT_DOUBLE_EQ(EnhancedOf7(Lee("MULT", 0.0, 1000.0), 4.0, 32.0), 32.0);
+}
+
+// 85 in the first entry lifts the mean of block 0 to 13, farther from 4 than the 0 of block 8: the
+// lower right triangle counts. Its 21 entries are 4, and 28 in entry 7 joins them for the row that
+// has none; all is divided by 28. mean = 112 / 28 = 4, var = (1120 - 448) / 27.
+TEST(FilterFle, VarianceBelowTheThresholdTakesTheLowerRightTriangle)
+{
+    std::vector<double> vdfSamples(49, 4.0);
+    vdfSamples[0] = 85.0;
+    vdfSamples[7] = 28.0;
+    vdfSamples[24] = 32.0;
+    const auto poMask = AllValid(1, 1, {3, 3});
+    const double dfVar = 672.0 / 27.0;
+    EXPECT_DOUBLE_EQ(
+        FilteredCentre(Lee("ADDI", 0.0, 1000.0), Image<double>(7, vdfSamples), poMask.get()),
+        28.0 * dfVar / (dfVar + NoiseOfFours()) + 4.0);
+}
+
+// Entry 20 of the second pixel's window is masked and still holds the 20 of the first one's. So
+// both add 36 and 432 to block 4, and 18 and 36, 6 and 12, 4 and 8 to the next three. 47 samples of
+// 2 and one of 20 count for mean = 114 / 48 and var = 588 / 48 - mean^2 - 1.
+TEST(FilterFle, MaskedSampleLeavesTheOneBeforeInTheSubBlocks)
+{
+    std::vector<double> vdfSamples(56, 2.0);
+    std::vector<int> vnValid(56, 1);
+    vdfSamples[2 * 8 + 6] = 20.0;
+    vdfSamples[2 * 8 + 7] = NAN;
+    vnValid[2 * 8 + 7] = 0;
+    const auto poMask = test::MaskOf(Image<int>(8, vnValid), {3, 3});
+    const Image<double> oOut =
+        Filtered(Lee("ADDI", 0.0, 1.0), Image<double>(8, vdfSamples), {3, 3}, poMask.get());
+    const double v =
+        ((864.0 - 576.0) + (72.0 - 144.0) + (24.0 - 16.0) + (16.0 - 64.0 / 9.0)) / 8.0 / 5.0;
+    const double dfVar = 12.25 - 2.375 * 2.375 - 1.0;
+    EXPECT_DOUBLE_EQ(oOut.Samples()[1], (2.0 - 2.375) * (dfVar / (dfVar + v)) + 2.375);
+}
+
+// 4 and 6: mean 5 and var = (52 - 50) / 2 - 1 = 0, where k is 0 and not 1 - 0 / 0.
+TEST(FilterFle, MultiplicativeNoiseWithoutVarianceGivesTheMean)
+{
+    std::vector<double> vdfSamples(49, 1000.0);
+    std::vector<int> vnValid(49, 0);
+    vdfSamples[24] = 4.0;
+    vdfSamples[48] = 6.0;
+    vnValid[24] = 1;
+    vnValid[48] = 1;
+    const auto poMask = test::MaskOf(Image<int>(7, vnValid), {3, 3});
+    EXPECT_EQ(FilteredCentre(Lee("MULT", 0.0, 1.0), Image<double>(7, vdfSamples), poMask.get()),
+              5.0);
+}
+
+TEST(FilterFle, BackgroundOfTheEnhancedPathIsZeroOrTheInputInAllChannels)
+{
+    std::vector<double> vdfSamples(9 * 7 * 2, 4.0);
+    for (std::size_t x = 0; x < 3; ++x)
+    {
+        vdfSamples[(3 * 9 + 3 + x) * 2] = 5.0;
+    }
+    const Image<double> oImage(18, vdfSamples);
+    std::vector<int> vnValid(63, 1);
+    vnValid[3 * 9 + 3] = 0;
+    const auto poMask = test::MaskOf(Image<int>(9, vnValid), {3, 3});
+    const auto poClip = test::MaskOf({{1, 0, 0}});
+    FilterFle oFilter = Lee("MULT", 1.0, 1.0);
+    EXPECT_EQ(Filtered(oFilter, oImage, {3, 3}, poMask.get(), poClip.get(), 2),
+              (Image<double>{{0, 0, 0, 0, 0, 0}}));
+    oFilter.SetBGZero(false);
+    EXPECT_EQ(Filtered(oFilter, oImage, {3, 3}, poMask.get(), poClip.get(), 2),
+              (Image<double>{{5, 4, 5, 4, 5, 4}}));
 }
 
 void ExpectMarginError(const FilterFle& oFilter, Margins oMargins, const char* pszMessage)

@@ -237,6 +237,25 @@ TEST(FilterSartex, SeveralInputChannelsAreRefused)
         "The input raster should have only 1 channel to process Sartex", "ProcessBlock");
 }
 
+TEST(FilterSartex, MarginsAreLookedAtBeforeTheChannelsOfInputAndOutput)
+{
+    const auto poNarrow = test::BlankRaster(1, 1, 2, eDT_64R);
+    const auto poWide = test::BlankRaster(1, 1, 2, eDT_64R, {1, 1});
+    const auto poOut = test::BlankRaster(1, 1, 3, eDT_64R);
+    FilterSartex oFilter = Textures({static_cast<SarTextureType>(9)});
+    oFilter.SetFilterSizeX(3);
+    ExpectTraced([&] { oFilter.Process(poNarrow.get(), nullptr, poOut.get(), nullptr); },
+                 "The margins in the input raster are too small according to the requested filter "
+                 "size.",
+                 "ProcessBlock");
+    ExpectTraced([&] { oFilter.Process(poWide.get(), nullptr, poOut.get(), nullptr); },
+                 "The input raster should have only 1 channel to process Sartex", "ProcessBlock");
+    const auto poOne = test::BlankRaster(1, 1, 1, eDT_64R, {1, 1});
+    ExpectTraced([&] { oFilter.Process(poOne.get(), nullptr, poOut.get(), nullptr); },
+                 "The number of output channels don't match the number of requested textures",
+                 "ProcessBlock");
+}
+
 TEST(FilterSartex, UnknownTextureIsRefusedAtItsTurn)
 {
     const auto poIn = test::RasterOf(kRow, {1, 0});

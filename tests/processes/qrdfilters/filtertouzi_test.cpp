@@ -231,6 +231,26 @@ TEST(FilterTouzi, NeutralWindowGrowsWhileItChangesLittle)
     EXPECT_EQ(Touzi(FilterTouzi(10.0, 0.1, 0.5, 0.1), Chessboard, 3), oOfSize(25, 24));
 }
 
+// The chessboard's halves are alike in all directions. A brighter column at the rim of 7 x 7 makes
+// them differ more than in 5 x 5, and that ends the growing whatever the variation does.
+TEST(FilterTouzi, NeutralWindowStopsWhereItsEdgeGetsClearer)
+{
+    const double dfCu = 0.523 / std::sqrt(10.0);
+    const double mean = 255.0 / 25.0;
+    const double cv = std::sqrt((225.0 * 13.0 + 25.0 * 12.0) / 25.0 - mean * mean) / mean;
+    const At oBrighter = [](int dy, int dx) { return Chessboard(dy, dx) + (dx == 3 ? 10.0 : 0.0); };
+    EXPECT_EQ(Touzi(FilterTouzi(10.0, 0.0, 0.5, 1e9), oBrighter), Blend(dfCu, mean, cv, 15.0));
+    EXPECT_NE(Touzi(FilterTouzi(10.0, 0.0, 0.5, 1e9), Chessboard), Blend(dfCu, mean, cv, 15.0));
+}
+
+// Of many looks even a flat area varies enough for a line: all four directions have the ratio 1,
+// and the last one is a diagonal, whose ten neighbours are divided by eleven.
+TEST(FilterTouzi, TieOfDirectionsGoesToTheLater)
+{
+    const At oFlat = [](int, int) { return 11.0; };
+    EXPECT_EQ(Touzi(FilterTouzi(1000.0, 1.0), oFlat), 10.5);
+}
+
 // The edge threshold plays no part: neither a line nor an edge is found by it.
 TEST(FilterTouzi, EdgeParameterIsReadByNothing)
 {
@@ -486,6 +506,18 @@ TEST(FilterTouzi, RefusesWhatItCannotFilter)
     EXPECT_EQ(oOut.GetMessage(), "Invalid type to dispatch.");
     EXPECT_EQ(oOut.GetLine(), 375U);
     EXPECT_EQ(Filtered(oFilter, *poReal)[0], 1.0);
+}
+
+TEST(FilterTouzi, RefusedOutputLeavesTheProcessorAsItWas)
+{
+    FilterTouzi oFilter;
+    const auto poIn = Drawn({[](int, int) { return 20.0; }});
+    const auto poMask = MaskedPixel();
+    const auto poComplex = BlankRaster(1, 1, 1, tessel::eDT_C64R);
+    EXPECT_EQ(Filtered(oFilter, *poIn, poMask.get())[0], 20.0);
+    oFilter.SetBGZero(true);
+    EXPECT_THROW(oFilter.Process(poIn.get(), nullptr, poComplex.get()), Exception);
+    EXPECT_EQ(Filtered(oFilter, *poIn, poMask.get())[0], 20.0);
 }
 
 TEST(FilterTouzi, CallOperatorKeepsMarginsAndOffsets)
