@@ -161,11 +161,8 @@ void QRDDataCopy::Process(Raster* poRasterIn, Mask* poMaskIn, Raster* poRasterOu
     Require(poRasterIn->moDataType.mbComplex == poRasterOut->moDataType.mbComplex,
             "Cannot copy from/to complex type to/from normal types.", pszFunction, 44);
 
-    using Factory = typedispatch::Factory2Template<InnerProcessor, IComplexProcessor>;
-    const auto oMake = [](const tessel::DataType& oIn, const tessel::DataType& oOut)
-    { return typedispatch::DispatchTypePair<Factory>(oIn, oOut, true); };
-    SelectProcessor<details::QRDDataCopyParams>(poRasterIn->moDataType, poRasterOut->moDataType,
-                                                *this, oMake);
+    SelectProcessor<InnerProcessor, details::QRDDataCopyParams>(
+        poRasterIn->moDataType, poRasterOut->moDataType, *this, true);
     // Unlike other filters, the copy takes its parameter anew for each block.
     dynamic_cast<details::QRDDataCopyParams&>(*mpoProcessor) = *this;
     if (moInputType.mbComplex)

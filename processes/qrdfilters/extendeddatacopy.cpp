@@ -157,11 +157,8 @@ void ExtendedDataCopy::ProcessBlock(Raster* poRasterIn, Raster* poRasterOut)
     {
         RequireRasters(poRasterIn, poRasterOut, kSource);
     }
-    using Factory = typedispatch::Factory2Template<InnerProcessor, IProcessor>;
-    const auto oMake = [](const tessel::DataType& oIn, const tessel::DataType& oOut)
-    { return typedispatch::DispatchTypePair<Factory>(oIn, oOut, false); };
-    const IProcessor& oProcessor = SelectProcessor<details::ExtendedDataCopyParams>(
-        poRasterIn->moDataType, poRasterOut->moDataType, *this, oMake);
+    const IProcessor& oProcessor = SelectProcessor<InnerProcessor, details::ExtendedDataCopyParams>(
+        poRasterIn->moDataType, poRasterOut->moDataType, *this);
     const std::unique_ptr<Mask> poClip(
         mpoClipBuilder != nullptr ? mpoClipBuilder->BuildMask(*poRasterIn) : nullptr);
     oProcessor.Process(poRasterIn, poClip.get(), poRasterOut);

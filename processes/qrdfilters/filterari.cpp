@@ -426,11 +426,8 @@ void FilterARI::Process(Raster* poRasterIn, Mask* poMaskIn, Raster* poRasterOut)
             __PRETTY_FUNCTION__, __LINE__);
 
     const RealInput oInput(poRasterIn);
-    using Factory = typedispatch::Factory2Template<InnerProcessor, IProcessor>;
-    const auto oMake = [](const tessel::DataType& oIn, const tessel::DataType& oOut)
-    { return typedispatch::DispatchTypePair<Factory>(oIn, oOut, false); };
-    const IProcessor& oProcessor = SelectProcessor<details::ARIParams>(
-        oInput.Get()->moDataType, poRasterOut->moDataType, *this, oMake);
+    const IProcessor& oProcessor = SelectProcessor<InnerProcessor, details::ARIParams>(
+        oInput.Get()->moDataType, poRasterOut->moDataType, *this);
     oProcessor.Process(oInput.Get(), poMaskIn, poRasterOut);
     const auto& oStats = dynamic_cast<const details::ARIStats&>(oProcessor);
     SetARIStats(oStats.GetARIMin(), oStats.GetARIMax());

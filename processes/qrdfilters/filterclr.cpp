@@ -176,10 +176,8 @@ void FilterClr::Process(Raster* poRasterIn, Mask* poMask, Raster* poRasterOut) c
         throw Exception("poRasterOut is NULL", kSource, __PRETTY_FUNCTION__, __LINE__);
     }
     Raster* const poInput = poRasterIn != nullptr ? poRasterIn : poRasterOut;
-    using Factory = typedispatch::Factory2Template<InnerProcessor, IProcessor>;
-    const auto oMake = [](const tessel::DataType& oIn, const tessel::DataType& oOut)
-    { return typedispatch::DispatchTypePair<Factory>(oIn, oOut, false); };
-    SelectProcessor<details::ClrParams>(poInput->moDataType, poRasterOut->moDataType, *this, oMake)
+    SelectProcessor<InnerProcessor, details::ClrParams>(poInput->moDataType,
+                                                        poRasterOut->moDataType, *this)
         .Process(poInput, poMask, poRasterOut);
 }
 

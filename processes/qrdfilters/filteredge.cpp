@@ -57,11 +57,8 @@ void FilterEdge::Process(tessel::Raster* poRasterIn, tessel::Mask* poMaskIn,
     RequireRealOutput(*poRasterOut, kSource);
 
     const RealInput oInput(poRasterIn);
-    using Factory = typedispatch::Factory2Template<InnerProcessor, IClipperProcessor>;
-    const auto oMake = [](const tessel::DataType& oIn, const tessel::DataType& oOut)
-    { return typedispatch::DispatchTypePair<Factory>(oIn, oOut, false); };
-    const IClipperProcessor& oProcessor = SelectProcessor<details::EdgeParams>(
-        oInput.Get()->moDataType, poRasterOut->moDataType, *this, oMake);
+    const IClipperProcessor& oProcessor = SelectProcessor<InnerProcessor, details::EdgeParams>(
+        oInput.Get()->moDataType, poRasterOut->moDataType, *this);
     oProcessor.Process(oInput.Get(), poMaskIn, poRasterOut, poMaskOut);
 }
 

@@ -491,11 +491,8 @@ void FilterHomogeneity::Process(Raster* poRasterIn, Mask* poMask, Raster* poRast
     Require(poRasterIn->mnChannels == poRasterOut->mnChannels,
             "Input and output must have the same number of channels");
 
-    using Factory = typedispatch::Factory2Template<InnerProcessor, IProcessor>;
-    const auto oMake = [](const tessel::DataType& oIn, const tessel::DataType& oOut)
-    { return typedispatch::DispatchTypePair<Factory>(oIn, oOut, false); };
-    SelectProcessor<details::HomogeneityParams>(poRasterIn->moDataType, poRasterOut->moDataType,
-                                                *this, oMake);
+    SelectProcessor<InnerProcessor, details::HomogeneityParams>(poRasterIn->moDataType,
+                                                                poRasterOut->moDataType, *this);
     // Unlike in other filters, the processor gets the table of each call.
     auto& oParams = dynamic_cast<details::HomogeneityParams&>(*mpoProcessor);
     oParams.SetGrey(mnGrey);

@@ -289,11 +289,8 @@ void ImageToBit::Process(Raster* poRasterIn, Mask* poMaskIn, Raster* poRasterOut
     // Unlike other filters, this one never looks at the types again.
     if (mpoProcessor == nullptr)
     {
-        using Factory = typedispatch::Factory2Template<InnerProcessor, IProcessor>;
-        const auto oMake = [](const DataType& oIn, const DataType& oOut)
-        { return typedispatch::DispatchTypePair<Factory>(oIn, oOut, true); };
-        SelectProcessor<details::ImageToBitParams>(poRasterIn->moDataType, poRasterOut->moDataType,
-                                                   *this, oMake);
+        SelectProcessor<InnerProcessor, details::ImageToBitParams>(
+            poRasterIn->moDataType, poRasterOut->moDataType, *this, true);
     }
     mpoProcessor->Process(poRasterIn, poMaskIn, poRasterOut);
 }

@@ -3,6 +3,7 @@
 #include <memory>
 #include <source_location>
 
+#include "basic/core/typedispatch/extendtypedispatch.h"
 #include "basic/tessel/mask/mask.h"
 #include "basic/tessel/raster/raster.h"
 
@@ -66,6 +67,19 @@ protected:
             mpoProcessor = std::move(poProcessor);
         }
         return *mpoProcessor;
+    }
+
+    /// The same, made from the template of all pairs of types. bExtendComplex: see
+    /// DispatchTypePair.
+    template <template <class, class> class InnerProcessor, class Params>
+    const Interface& SelectProcessor(const tessel::DataType& oIn, const tessel::DataType& oOut,
+                                     const Params& oParams, bool bExtendComplex = false) const
+    {
+        using Factory = typedispatch::Factory2Template<InnerProcessor, Interface>;
+        return SelectProcessor(
+            oIn, oOut, oParams,
+            [bExtendComplex](const tessel::DataType& oFrom, const tessel::DataType& oTo)
+            { return typedispatch::DispatchTypePair<Factory>(oFrom, oTo, bExtendComplex); });
     }
 
     mutable std::shared_ptr<Interface> mpoProcessor;
