@@ -51,7 +51,7 @@ public:
             mvdfSums[i] = ElementOf(vdfSums, i);
             for (std::size_t j = i; j < nChannels; ++j)
             {
-                mvdfSums[(1 + j - i) * mnRow + i] = ElementOf(vdfProducts, k++);
+                mvdfSums[(1 + j) * mnRow + i] = ElementOf(vdfProducts, k++);
             }
         }
     }
@@ -84,7 +84,7 @@ public:
             SetElement(vdfSums, i, mvdfSums[i]);
             for (std::size_t j = i; j < mnChannels; ++j)
             {
-                SetElement(vdfProducts, k++, mvdfSums[(1 + j - i) * mnRow + i]);
+                SetElement(vdfProducts, k++, mvdfSums[(1 + j) * mnRow + i]);
             }
         }
     }
