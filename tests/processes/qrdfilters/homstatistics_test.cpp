@@ -295,6 +295,29 @@ TEST_F(HomStatistics, PassesTheErrorsOfTheReaderOn)
               "memory: broken");
 }
 
+// 20 MiB of values in rows of half a MiB: single precision keeps what the order of the rows makes.
+TEST_F(HomStatistics, SumsLargeImagesInTheOrderOfTheirRows)
+{
+    constexpr std::size_t kWidth = 1U << 17;
+    Random oRandom(32);
+    std::vector<float> vfValues(kWidth * 40);
+    std::vector<float> vfSums(2);
+    for (std::size_t i = 0; i < vfValues.size(); ++i)
+    {
+        vfValues[i] = static_cast<float>(oRandom() % 100000) / 7;
+        vfSums[i % 2] += vfValues[i];
+    }
+    std::vector<U8> vnClasses(vfValues.size());
+    for (std::size_t i = 1; i < vnClasses.size(); i += 2)
+    {
+        vnClasses[i] = 1;
+    }
+    const auto fCount = static_cast<float>(kWidth * 20);
+    EXPECT_EQ(Table(Image<float>(kWidth, vfValues), Image<U8>(kWidth, vnClasses), kMean),
+              Entries(256, {{0, static_cast<int>(vfSums[0] / fCount + 0.5)},
+                            {1, static_cast<int>(vfSums[1] / fCount + 0.5)}}));
+}
+
 // The definition, on random classes and values with a few hundred pixels each.
 TEST_F(HomStatistics, FollowsTheDefinition)
 {
