@@ -9,8 +9,8 @@
 #include <vector>
 
 #include "bench/support.h"
-#include "processes/qrdfilters/eigensystem.h"
 #include "processes/qrdfilters/sampleconversion.h"
+#include "processes/qrdfilters/statistics/eigensystem.h"
 
 namespace kor::bench
 {

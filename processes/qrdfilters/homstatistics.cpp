@@ -11,9 +11,9 @@
 
 #include "platform/datasources/basicreader.h"
 #include "platform/exception/exception.h"
-#include "processes/qrdfilters/checkedvector.h"
 #include "processes/qrdfilters/filterhom.h"
-#include "processes/qrdfilters/valuecounts.h"
+#include "processes/qrdfilters/statistics/checkedvector.h"
+#include "processes/qrdfilters/statistics/valuecounts.h"
 
 namespace kor::filters
 {

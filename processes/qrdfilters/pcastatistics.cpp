@@ -11,13 +11,13 @@
 #include "platform/datasources/bitmapmaskbuilder.h"
 #include "platform/datasources/datasetmanager.h"
 #include "platform/exception/exception.h"
-#include "processes/qrdfilters/checkedvector.h"
-#include "processes/qrdfilters/eigensystem.h"
 #include "processes/qrdfilters/filteringmaskbuilder.h"
 #include "processes/qrdfilters/filterpca.h"
 #include "processes/qrdfilters/findbyte.h"
 #include "processes/qrdfilters/kernels/covariancesums.h"
 #include "processes/qrdfilters/samplerows.h"
+#include "processes/qrdfilters/statistics/checkedvector.h"
+#include "processes/qrdfilters/statistics/eigensystem.h"
 
 namespace kor::filters
 {
