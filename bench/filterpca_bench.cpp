@@ -2,11 +2,15 @@
 
 #include <benchmark/benchmark.h>
 
+#include <algorithm>
 #include <memory>
+#include <numeric>
+#include <random>
 #include <vector>
 
 #include "bench/support.h"
 #include "processes/qrdfilters/sampleconversion.h"
+#include "processes/qrdfilters/statistics/eigensystem.h"
 
 namespace kor::bench
 {
@@ -147,12 +151,41 @@ void BM_FilterPCAPlain(benchmark::State& oState)
     oState.SetItemsProcessed(oState.iterations() * kBlock.Pixels());
 }
 
+/// Values and vectors of the covariance of random channels; items are matrices.
+void BM_Eigensystem(benchmark::State& oState)
+{
+    const auto nSize = static_cast<std::size_t>(oState.range(0));
+    std::mt19937 oRandom(kSeed);
+    std::normal_distribution<float> oNormal(0, 30);
+    std::vector<float> vfRoot(nSize * nSize);
+    std::generate(vfRoot.begin(), vfRoot.end(), [&] { return oNormal(oRandom); });
+    std::vector<float> vfCovariance(nSize * nSize);
+    for (std::size_t i = 0; i < nSize * nSize; ++i)
+    {
+        vfCovariance[i] =
+            std::inner_product(&vfRoot[i / nSize * nSize], &vfRoot[i / nSize * nSize] + nSize,
+                               &vfRoot[i % nSize * nSize], 0.0F);
+    }
+    std::vector<float> vfMatrix;
+    std::vector<float> vfValues(nSize);
+    for (auto _ : oState)
+    {
+        vfMatrix = vfCovariance;
+        filters::SolveEigensystem(nSize, vfMatrix, vfValues);
+        benchmark::DoNotOptimize(vfValues.data());
+    }
+    oState.SetItemsProcessed(oState.iterations());
+}
+
+BENCHMARK(BM_Eigensystem)->ArgName("channels")->Arg(6)->Arg(16)->Arg(64);
 BENCHMARK_TEMPLATE(BM_Covariance, unsigned short)->ArgName("channels")->Arg(3)->Arg(6)->Arg(12);
 BENCHMARK_TEMPLATE(BM_CovariancePlain, unsigned short)
     ->ArgName("channels")
     ->Arg(3)
     ->Arg(6)
     ->Arg(12);
+BENCHMARK_TEMPLATE(BM_Covariance, float)->ArgName("channels")->Arg(6);
+BENCHMARK_TEMPLATE(BM_CovariancePlain, float)->ArgName("channels")->Arg(6);
 BENCHMARK_TEMPLATE(BM_Covariance, double)->ArgName("channels")->Arg(6);
 BENCHMARK_TEMPLATE(BM_CovariancePlain, double)->ArgName("channels")->Arg(6);
 BENCHMARK_TEMPLATE(BM_FilterPCA, unsigned short, unsigned char)

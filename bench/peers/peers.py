@@ -160,9 +160,33 @@ def modes():
 
 def statistics():
     bands = np.random.default_rng(1).normal(100.0, 20.0, (SIDE * SIDE, 6)).astype(np.float32)
-    tell("BM_CovarianceSums", "NumPy cov", lambda: np.cov(bands, rowvar=False))
-    tell("BM_CovarianceSums", "OpenCV calcCovarMatrix",
+    tell("BM_Covariance<float>/channels:6", "NumPy cov", lambda: np.cov(bands, rowvar=False))
+    tell("BM_Covariance<float>/channels:6", "OpenCV calcCovarMatrix",
          lambda: cv2.calcCovarMatrix(bands, None, cv2.COVAR_NORMAL | cv2.COVAR_ROWS))
+    root = np.random.default_rng(1).normal(0.0, 30.0, (64, 64)).astype(np.float32)
+    for size in (6, 16, 64):
+        matrix = root[:size, :size] @ root[:size, :size].T
+        tell(f"BM_Eigensystem/channels:{size}", "LAPACK eigh", lambda: np.linalg.eigh(matrix), 1)
+
+
+def transforms():
+    bands = np.random.default_rng(1).normal(100.0, 20.0, (SIDE * SIDE, 6)).astype(np.float32)
+    means = bands.mean(axis=0)
+    vectors = np.linalg.eigh(np.cov(bands[:10000], rowvar=False))[1].astype(np.float32)
+    middle, out = np.empty_like(bands), np.empty_like(bands)
+
+    def project():
+        np.subtract(bands, means, out=middle)
+        np.matmul(middle, vectors, out=out)
+        np.multiply(out, np.float32(0.5), out=out)
+        np.add(out, np.float32(127.5), out=out)
+
+    tell("BM_FilterPCA<float, float>/channels:6/outputs:6", "NumPy matmul", project)
+    classes = speckle(np.uint8)
+    table = (np.arange(256) * 37 % 256).astype(np.uint8)
+    mapped = np.empty_like(classes)
+    tell("BM_FilterHOM<unsigned char, unsigned char>", "OpenCV LUT",
+         lambda: cv2.LUT(classes, table, dst=mapped))
 
 
 if __name__ == "__main__":
@@ -171,3 +195,4 @@ if __name__ == "__main__":
     stencils()
     modes()
     statistics()
+    transforms()

@@ -4,8 +4,12 @@
 #include <array>
 #include <cstdint>
 #include <limits>
+#include <memory>
+#include <mutex>
+#include <numeric>
 #include <span>
 #include <type_traits>
+#include <vector>
 
 #include "basic/core/typedispatch/typelist.h"
 #include "platform/exception/exception.h"
@@ -23,18 +27,16 @@ namespace
 
 constexpr const char* kSource = "processes/qrdfilters/filterhom";
 
-constexpr std::uint32_t kOutside = std::numeric_limits<std::uint32_t>::max();
-
-/// A sample as an index of the table; negative ones, and what no int can hold, lie outside of every
-/// table.
+/// A sample as an index of the table; negative ones, and what no int can hold, become indices from
+/// 2^31 on, outside of every table.
 template <class TIn>
 std::uint32_t IndexOf(TIn xIn)
 {
     const auto x = static_cast<Arithmetic<TIn>>(xIn);
     if constexpr (std::is_floating_point_v<TIn>)
     {
-        const bool bHeld = x > TIn(-1) && x < TIn(2147483648.0);
-        return bHeld ? static_cast<std::uint32_t>(x) : kOutside;
+        const TIn xHeld = x > TIn(-1) && x < TIn(2147483648.0) ? x : TIn(-1);
+        return static_cast<std::uint32_t>(static_cast<int>(xHeld));
     }
     else
     {
@@ -78,22 +80,86 @@ void FindIndices(const unsigned char* pIn, std::size_t nStride, std::span<std::u
     }
 }
 
-/// The table's value for each index to pOut, nStride elements apart.
-template <class TOut>
-void WriteValues(std::span<const std::uint32_t> oIndices, std::span<const int> oTable,
-                 unsigned char* pOut, std::size_t nStride)
-{
-    TOut* const pSamples = reinterpret_cast<TOut*>(pOut);
-    for (std::size_t i = 0; i < oIndices.size(); ++i)
-    {
-        const std::size_t nIndex = oIndices[i];
-        pSamples[i * nStride] = StoredValue<TOut>(nIndex < oTable.size() ? oTable[nIndex] : 0);
-    }
-}
-
 using IndexRow = void (*)(const unsigned char*, std::size_t, std::span<std::uint32_t>);
-using ValueRow = void (*)(std::span<const std::uint32_t>, std::span<const int>, unsigned char*,
-                          std::size_t);
+
+constexpr std::size_t kBytes = 256;
+
+/// A run of samples in memory, so many elements apart.
+struct Run
+{
+    unsigned char* mpFirst;
+    std::size_t mnStride;
+    std::size_t mnCount;
+};
+
+/// The table with its values as they are stored.
+class StoredTable
+{
+public:
+    virtual ~StoredTable() = default;
+    /// The value for each index to oOut.
+    virtual void WriteByIndex(const std::uint32_t* pIndices, const Run& oOut) const = 0;
+    /// The same for samples of one byte, for which the indices are known.
+    virtual void WriteByBytes(const Run& oIn, const Run& oOut) const = 0;
+};
+
+template <class TOut>
+class TableOf : public StoredTable
+{
+public:
+    TableOf(std::span<const int> oTable, std::span<const std::uint32_t, kBytes> oIndicesOfBytes)
+        : mvxValues(oTable.size() + 1, TOut(0))
+    {
+        std::transform(oTable.begin(), oTable.end(), mvxValues.begin(), StoredValue<TOut>);
+        for (std::size_t i = 0; i < kBytes; ++i)
+        {
+            maxByBytes[i] = ValueAt(oIndicesOfBytes[i]);
+        }
+    }
+
+    void WriteByIndex(const std::uint32_t* pIndices, const Run& oOut) const override
+    {
+        TOut* const pOut = reinterpret_cast<TOut*>(oOut.mpFirst);
+        for (std::size_t i = 0; i < oOut.mnCount; ++i)
+        {
+            pOut[i * oOut.mnStride] = ValueAt(pIndices[i]);
+        }
+    }
+
+    void WriteByBytes(const Run& oIn, const Run& oOut) const override
+    {
+        TOut* const pOut = reinterpret_cast<TOut*>(oOut.mpFirst);
+        if (oIn.mnStride == 1 && oOut.mnStride == 1)
+        {
+            std::transform(oIn.mpFirst, oIn.mpFirst + oIn.mnCount, pOut,
+                           [this](unsigned char nByte) { return maxByBytes[nByte]; });
+            return;
+        }
+        for (std::size_t i = 0; i < oIn.mnCount; ++i)
+        {
+            pOut[i * oOut.mnStride] = maxByBytes[oIn.mpFirst[i * oIn.mnStride]];
+        }
+    }
+
+private:
+    TOut ValueAt(std::uint32_t nIndex) const
+    {
+        return mvxValues[std::min<std::size_t>(nIndex, mvxValues.size() - 1)];
+    }
+
+    std::vector<TOut> mvxValues;  ///< the last one stands for all indices outside
+    std::array<TOut, kBytes> maxByBytes;
+};
+
+using MakeTable = std::unique_ptr<StoredTable> (*)(std::span<const int>,
+                                                   std::span<const std::uint32_t, kBytes>);
+
+template <class TOut>
+std::unique_ptr<StoredTable> MakeTableOf(std::span<const int> oTable,
+                                         std::span<const std::uint32_t, kBytes> oIndicesOfBytes)
+{
+    return std::make_unique<TableOf<TOut>>(oTable, oIndicesOfBytes);
+}
 
 /// All of a processor but the names of its types.
 class TableProcessor : public IProcessor, public details::HOMParams
@@ -102,25 +168,22 @@ public:
     void Process(Raster* poRasterIn, Mask* /*poMaskIn*/, Raster* poRasterOut) const override
     {
         RequireSameSize(*poRasterIn, *poRasterOut, kSource);
-        std::array<std::uint32_t, 1024> anIndices;
-        const std::size_t nStrideIn = ElementsPerPixel(*poRasterIn);
-        const std::size_t nStrideOut = ElementsPerPixel(*poRasterOut);
+        std::call_once(moTableMade, [this] { MakeStoredTable(); });
         for (std::uint32_t y = 0; y < poRasterIn->mnHeight; ++y)
         {
-            for (std::size_t x = 0; x < poRasterIn->mnWidth; x += anIndices.size())
-            {
-                const std::size_t nCount = std::min(anIndices.size(), poRasterIn->mnWidth - x);
-                const std::span<std::uint32_t> oIndices(anIndices.data(), nCount);
-                const auto nX = static_cast<std::int64_t>(x);
-                mpfnIndices(poRasterIn->GetPixel(nX, y), nStrideIn, oIndices);
-                mpfnValues(oIndices, mvMeanMode, poRasterOut->GetPixel(nX, y), nStrideOut);
-            }
+            MapRow(
+                {poRasterIn->GetPixel(0, y), ElementsPerPixel(*poRasterIn), poRasterIn->mnWidth},
+                {poRasterOut->GetPixel(0, y), ElementsPerPixel(*poRasterOut), poRasterIn->mnWidth});
         }
     }
 
 protected:
-    TableProcessor(IndexRow pfnIndices, ValueRow pfnValues)
-        : mpfnIndices(pfnIndices), mpfnValues(pfnValues)
+    TableProcessor(IndexRow pfnIndices, MakeTable pfnMakeTable, std::size_t nInBytes,
+                   std::size_t nOutBytes)
+        : mpfnIndices(pfnIndices),
+          mpfnMakeTable(pfnMakeTable),
+          mnInBytes(nInBytes),
+          mnOutBytes(nOutBytes)
     {
     }
 
@@ -130,8 +193,43 @@ private:
         return std::size_t{oRaster.mnChannels} * (oRaster.moDataType.mbComplex ? 2U : 1U);
     }
 
+    void MakeStoredTable() const
+    {
+        std::array<std::uint32_t, kBytes> anIndices{};
+        if (mnInBytes == 1)
+        {
+            std::array<unsigned char, kBytes> anBytes;
+            std::iota(anBytes.begin(), anBytes.end(), static_cast<unsigned char>(0));
+            mpfnIndices(anBytes.data(), 1, anIndices);
+        }
+        mpoTable = mpfnMakeTable(mvMeanMode, anIndices);
+    }
+
+    void MapRow(const Run& oIn, const Run& oOut) const
+    {
+        if (mnInBytes == 1)
+        {
+            mpoTable->WriteByBytes(oIn, oOut);
+            return;
+        }
+        std::array<std::uint32_t, 1024> anIndices;
+        for (std::size_t x = 0; x < oIn.mnCount; x += anIndices.size())
+        {
+            const std::size_t nCount = std::min(anIndices.size(), oIn.mnCount - x);
+            mpfnIndices(oIn.mpFirst + x * oIn.mnStride * mnInBytes, oIn.mnStride,
+                        {anIndices.data(), nCount});
+            mpoTable->WriteByIndex(anIndices.data(), {oOut.mpFirst + x * oOut.mnStride * mnOutBytes,
+                                                      oOut.mnStride, nCount});
+        }
+    }
+
     IndexRow mpfnIndices;
-    ValueRow mpfnValues;
+    MakeTable mpfnMakeTable;
+    std::size_t mnInBytes;
+    std::size_t mnOutBytes;
+    // Made with the first block, when the parameters are in.
+    mutable std::once_flag moTableMade;
+    mutable std::unique_ptr<StoredTable> mpoTable;
 };
 
 }  // namespace
@@ -140,7 +238,10 @@ template <class TIn, class TOut>
 class FilterHOM::InnerProcessor : public TableProcessor
 {
 public:
-    InnerProcessor() : TableProcessor(FindIndices<TIn>, WriteValues<TOut>) {}
+    InnerProcessor()
+        : TableProcessor(FindIndices<TIn>, MakeTableOf<TOut>, sizeof(TIn), sizeof(TOut))
+    {
+    }
 };
 
 template <class TIn, class TOut>

@@ -7,9 +7,9 @@
 #include "basic/core/typedispatch/extendtypedispatch.h"
 #include "platform/exception/exception.h"
 #include "processes/qrdfilters/blockcontract.h"
-#include "processes/qrdfilters/checkedvector.h"
 #include "processes/qrdfilters/kernels/projectpixels.h"
 #include "processes/qrdfilters/samplerows.h"
+#include "processes/qrdfilters/statistics/checkedvector.h"
 
 namespace kor::filters
 {

@@ -11,9 +11,9 @@
 
 #include "platform/datasources/basicreader.h"
 #include "platform/exception/exception.h"
-#include "processes/qrdfilters/checkedvector.h"
 #include "processes/qrdfilters/filterhom.h"
-#include "processes/qrdfilters/valuecounts.h"
+#include "processes/qrdfilters/statistics/checkedvector.h"
+#include "processes/qrdfilters/statistics/valuecounts.h"
 
 namespace kor::filters
 {
@@ -139,77 +139,99 @@ private:
     std::vector<std::uint32_t> mvnTotals;
 };
 
-/// Adds the first channels of a row of values and a row of classes.
+/// Adds the first channels of a block of values and a block of classes, row by row.
 template <class TValue, class TClass, class Table>
-void AddRow(const Raster& oValues, const Raster& oClasses, Table& oTable)
+void AddRows(const Raster& oValues, const Raster& oClasses, Table& oTable)
 {
-    const TValue* pValue = oValues.GetPixelAs<TValue>(0, 0);
-    const TClass* pClass = oClasses.GetPixelAs<TClass>(0, 0);
-    for (std::uint32_t x = 0; x < oValues.mnWidth; ++x)
+    for (std::uint32_t y = 0; y < oValues.mnHeight; ++y)
     {
-        oTable.Add(IndexOf(*pClass), *pValue);
-        pValue += oValues.mnChannels;
-        pClass += oClasses.mnChannels;
+        const TValue* pValue = oValues.GetPixelAs<TValue>(0, y);
+        const TClass* pClass = oClasses.GetPixelAs<TClass>(0, y);
+        for (std::uint32_t x = 0; x < oValues.mnWidth; ++x)
+        {
+            oTable.Add(IndexOf(*pClass), *pValue);
+            pValue += oValues.mnChannels;
+            pClass += oClasses.mnChannels;
+        }
     }
 }
 
 template <class Table>
-using RowFunction = void (*)(const Raster&, const Raster&, Table&);
+using RowsFunction = void (*)(const Raster&, const Raster&, Table&);
 
 template <class Table>
 struct ServedPair
 {
     DataType oValues;
     DataType oClasses;
-    RowFunction<Table> pfnAddRow;
+    RowsFunction<Table> pfnAddRows;
 };
 
-/// The row function for a pair of types; null for those that are not served.
+/// The function for a pair of types; null for those that are not served.
 template <class Table>
-RowFunction<Table> FindRowFunction(const DataType& oValues, const DataType& oClasses)
+RowsFunction<Table> FindRowsFunction(const DataType& oValues, const DataType& oClasses)
 {
     using namespace tessel;
     using U8 = unsigned char;
     using U16 = unsigned short;
     // Meant: 8-bit values with 16-bit unsigned classes are not among them.
     static constexpr ServedPair<Table> kPairs[] = {
-        {eDT_32R, eDT_8U, AddRow<float, U8, Table>},
-        {eDT_32R, eDT_32R, AddRow<float, float, Table>},
-        {eDT_32R, eDT_16U, AddRow<float, U16, Table>},
-        {eDT_32R, eDT_16S, AddRow<float, short, Table>},
-        {eDT_16U, eDT_8U, AddRow<U16, U8, Table>},
-        {eDT_16U, eDT_32R, AddRow<U16, float, Table>},
-        {eDT_16U, eDT_16U, AddRow<U16, U16, Table>},
-        {eDT_16U, eDT_16S, AddRow<U16, short, Table>},
-        {eDT_16S, eDT_8U, AddRow<short, U8, Table>},
-        {eDT_16S, eDT_32R, AddRow<short, float, Table>},
-        {eDT_16S, eDT_16U, AddRow<short, U16, Table>},
-        {eDT_16S, eDT_16S, AddRow<short, short, Table>},
-        {eDT_8U, eDT_8U, AddRow<U8, U8, Table>},
-        {eDT_8U, eDT_32R, AddRow<U8, float, Table>},
-        {eDT_8U, eDT_16S, AddRow<U8, short, Table>},
+        {eDT_32R, eDT_8U, AddRows<float, U8, Table>},
+        {eDT_32R, eDT_32R, AddRows<float, float, Table>},
+        {eDT_32R, eDT_16U, AddRows<float, U16, Table>},
+        {eDT_32R, eDT_16S, AddRows<float, short, Table>},
+        {eDT_16U, eDT_8U, AddRows<U16, U8, Table>},
+        {eDT_16U, eDT_32R, AddRows<U16, float, Table>},
+        {eDT_16U, eDT_16U, AddRows<U16, U16, Table>},
+        {eDT_16U, eDT_16S, AddRows<U16, short, Table>},
+        {eDT_16S, eDT_8U, AddRows<short, U8, Table>},
+        {eDT_16S, eDT_32R, AddRows<short, float, Table>},
+        {eDT_16S, eDT_16U, AddRows<short, U16, Table>},
+        {eDT_16S, eDT_16S, AddRows<short, short, Table>},
+        {eDT_8U, eDT_8U, AddRows<U8, U8, Table>},
+        {eDT_8U, eDT_32R, AddRows<U8, float, Table>},
+        {eDT_8U, eDT_16S, AddRows<U8, short, Table>},
     };
     for (const ServedPair<Table>& oPair : kPairs)
     {
         if (oPair.oValues == oValues && oPair.oClasses == oClasses)
         {
-            return oPair.pfnAddRow;
+            return oPair.pfnAddRows;
         }
     }
     return nullptr;
 }
 
-/// Shows all rows of both readers, which read one row at a time, to a table.
+/// Rows that both readers read at a time: files in tiles, such as compressed ones, are slow row by
+/// row. Pixels come in the same order.
+unsigned int RowsAtOnce(const datasources::IRasterReader& oValues,
+                        const datasources::IRasterReader& oClasses)
+{
+    constexpr std::uint64_t kMostBytes = 1U << 24;
+    const auto oPixelBytes = [](const datasources::IRasterReader& oReader)
+    { return std::uint64_t{oReader.GetChannelCount()} * oReader.GetDataType().GetSampleBytes(); };
+    const std::uint64_t nRowBytes =
+        std::max(oPixelBytes(oValues), oPixelBytes(oClasses)) * oValues.GetWidth();
+    const std::uint64_t nMost = kMostBytes / std::max<std::uint64_t>(nRowBytes, 1);
+    return static_cast<unsigned int>(
+        std::max<std::uint64_t>(std::min<std::uint64_t>(nMost, oValues.GetHeight()), 1));
+}
+
+/// Shows all rows of both readers to a table.
 template <class Table>
 Table Gather(datasources::IRasterReader& oValues, datasources::IRasterReader& oClasses)
 {
     Table oTable(TableSize(oClasses.GetDataType()), TableSize(oValues.GetDataType()));
-    const auto pfnAddRow = FindRowFunction<Table>(oValues.GetDataType(), oClasses.GetDataType());
-    for (unsigned int y = 0; pfnAddRow != nullptr && y < oValues.GetHeight(); ++y)
+    const auto pfnAddRows = FindRowsFunction<Table>(oValues.GetDataType(), oClasses.GetDataType());
+    const unsigned int nRows = RowsAtOnce(oValues, oClasses);
+    oValues.SetTileSize(oValues.GetWidth(), nRows);
+    oClasses.SetTileSize(oClasses.GetWidth(), nRows);
+    const unsigned int nTiles = (oValues.GetHeight() + nRows - 1) / nRows;
+    for (unsigned int nTile = 0; pfnAddRows != nullptr && nTile < nTiles; ++nTile)
     {
-        const std::unique_ptr<Raster> poValues(oValues.GetRaster(y));
-        const std::unique_ptr<Raster> poClasses(oClasses.GetRaster(y));
-        pfnAddRow(*poValues, *poClasses, oTable);
+        const std::unique_ptr<Raster> poValues(oValues.GetRaster(nTile));
+        const std::unique_ptr<Raster> poClasses(oClasses.GetRaster(nTile));
+        pfnAddRows(*poValues, *poClasses, oTable);
     }
     return oTable;
 }
@@ -234,8 +256,6 @@ void HOMStatistics::GetRasterStats()
 {
     datasources::BasicReader oValues(moFileName, mvValueChannels, 1);
     datasources::BasicReader oClasses(moFileName, mvClassChannels, 1);
-    oValues.SetTileSize(oValues.GetWidth(), 1);
-    oClasses.SetTileSize(oClasses.GetWidth(), 1);
     mvMeanMode.resize(mvMeanMode.size() + TableSize(oClasses.GetDataType()), 0);
     try
     {

@@ -5,8 +5,8 @@
 #include <vector>
 
 #include "platform/ledger/report.h"
-#include "processes/qrdfilters/checkedvector.h"
 #include "processes/qrdfilters/filterpca.h"
+#include "processes/qrdfilters/statistics/checkedvector.h"
 
 namespace kor::filters
 {

@@ -11,13 +11,13 @@
 #include "platform/datasources/bitmapmaskbuilder.h"
 #include "platform/datasources/datasetmanager.h"
 #include "platform/exception/exception.h"
-#include "processes/qrdfilters/checkedvector.h"
-#include "processes/qrdfilters/eigensystem.h"
 #include "processes/qrdfilters/filteringmaskbuilder.h"
 #include "processes/qrdfilters/filterpca.h"
 #include "processes/qrdfilters/findbyte.h"
 #include "processes/qrdfilters/kernels/covariancesums.h"
 #include "processes/qrdfilters/samplerows.h"
+#include "processes/qrdfilters/statistics/checkedvector.h"
+#include "processes/qrdfilters/statistics/eigensystem.h"
 
 namespace kor::filters
 {
@@ -51,7 +51,7 @@ public:
             mvdfSums[i] = ElementOf(vdfSums, i);
             for (std::size_t j = i; j < nChannels; ++j)
             {
-                mvdfSums[(1 + j - i) * mnRow + i] = ElementOf(vdfProducts, k++);
+                mvdfSums[(1 + j) * mnRow + i] = ElementOf(vdfProducts, k++);
             }
         }
     }
@@ -84,7 +84,7 @@ public:
             SetElement(vdfSums, i, mvdfSums[i]);
             for (std::size_t j = i; j < mnChannels; ++j)
             {
-                SetElement(vdfProducts, k++, mvdfSums[(1 + j - i) * mnRow + i]);
+                SetElement(vdfProducts, k++, mvdfSums[(1 + j) * mnRow + i]);
             }
         }
     }

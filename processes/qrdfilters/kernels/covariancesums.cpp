@@ -24,41 +24,43 @@ constexpr std::size_t kLanes = hn::MaxLanes(kTag);
 // Rows of products that grow together: enough to hide the time that an addition takes.
 constexpr std::size_t kMostRows = 8;
 
-/// One vector of some rows, from row nFirst on. In the tile of row 0 the sums of the samples grow
-/// as well.
+/// One vector of some rows, from row 1 + nFirst on. With the first of them, the sums of the samples
+/// grow as well.
 struct Tile
 {
-    const double* pPixels;  ///< of the tile's first lane
+    const double* pPixels;  ///< first channel of the tile's lanes
+    const double* pRows;    ///< first channel of its rows
     std::size_t nPixels;
     std::size_t nChannels;
-    std::size_t nFirst;
-    double* pSums;  ///< row 0 at the tile's first lane
+    double* pSums;      ///< row 0 at the tile's first lane
+    double* pProducts;  ///< its first row
 };
 
 template <std::size_t kRows, bool kWithSamples>
 void AddTile(const Tile& oTile)
 {
     const std::size_t nRow = CovarianceRow(oTile.nChannels);
-    double* const pProducts = oTile.pSums + (1 + oTile.nFirst) * nRow;
     hn::Vec<Doubles> aoProducts[kRows];
     for (std::size_t r = 0; r < kRows; ++r)
     {
-        aoProducts[r] = hn::LoadU(kTag, pProducts + r * nRow);
+        aoProducts[r] = hn::LoadU(kTag, oTile.pProducts + r * nRow);
     }
     auto oSamples = hn::LoadU(kTag, oTile.pSums);
     const double* pPixel = oTile.pPixels;
-    for (std::size_t p = 0; p < oTile.nPixels; ++p, pPixel += oTile.nChannels)
+    const double* pRow = oTile.pRows;
+    for (std::size_t p = 0; p < oTile.nPixels; ++p)
     {
-        const auto oFirst = hn::LoadU(kTag, pPixel);
+        const auto oLanes = hn::LoadU(kTag, pPixel);
         if constexpr (kWithSamples)
         {
-            oSamples = hn::Add(oSamples, oFirst);
+            oSamples = hn::Add(oSamples, oLanes);
         }
         for (std::size_t r = 0; r < kRows; ++r)
         {
-            const auto oSecond = hn::LoadU(kTag, pPixel + oTile.nFirst + r);
-            aoProducts[r] = hn::Add(aoProducts[r], hn::Mul(oFirst, oSecond));
+            aoProducts[r] = hn::Add(aoProducts[r], hn::Mul(oLanes, hn::Set(kTag, pRow[r])));
         }
+        pPixel += oTile.nChannels;
+        pRow += oTile.nChannels;
     }
     if constexpr (kWithSamples)
     {
@@ -66,7 +68,7 @@ void AddTile(const Tile& oTile)
     }
     for (std::size_t r = 0; r < kRows; ++r)
     {
-        hn::StoreU(aoProducts[r], kTag, pProducts + r * nRow);
+        hn::StoreU(aoProducts[r], kTag, oTile.pProducts + r * nRow);
     }
 }
 
@@ -85,12 +87,12 @@ void AddPixels(const double* pPixels, std::size_t nPixels, std::size_t nChannels
         TileFunctions<false>(std::make_index_sequence<kMostRows>());
     for (std::size_t i = 0; i < nChannels; i += kLanes)
     {
-        // Lane i has partners up to the last channel.
-        for (std::size_t d = 0; d < nChannels - i; d += kMostRows)
+        for (std::size_t j = i; j < nChannels; j += kMostRows)
         {
-            const auto& aoTiles = d == 0 ? kWithSamples : kProductsAlone;
-            const std::size_t nRows = std::min(kMostRows, nChannels - i - d);
-            aoTiles[nRows - 1]({pPixels + i, nPixels, nChannels, d, pSums + i});
+            const auto& aoTiles = j == i ? kWithSamples : kProductsAlone;
+            const std::size_t nRows = std::min(kMostRows, nChannels - j);
+            aoTiles[nRows - 1]({pPixels + i, pPixels + j, nPixels, nChannels, pSums + i,
+                                pSums + (1 + j) * CovarianceRow(nChannels) + i});
         }
     }
 }

@@ -12,8 +12,8 @@ namespace kor::filters::kernels
 inline constexpr std::size_t kPixelPadding = 8;
 
 /// The sums lie in nChannels + 1 rows of this many doubles: row 0 is the sums of the samples, and
-/// element i of row 1 + d the sum of the products x[i] * x[i + d]. Elements that stand for no sum
-/// may hold anything.
+/// element i of row 1 + j, i up to j, the sum of the products x[i] * x[j]. Elements that stand for
+/// no sum may hold anything.
 constexpr std::size_t CovarianceRow(std::size_t nChannels)
 {
     return (nChannels + kPixelPadding - 1) / kPixelPadding * kPixelPadding;

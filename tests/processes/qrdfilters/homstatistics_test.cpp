@@ -39,14 +39,14 @@ protected:
     {
         const std::string oFile = moFolder.File("scene" + std::to_string(mnFiles++));
         const Kordsk poKordsk = NewKordsk(oFile);
-        const auto oAppend = [&](const tessel::Raster& oBlock)
-        {
-            const unsigned int nChannel = poKordsk->CreateChannels(oBlock);
-            datasources::BasicWriter(poKordsk.get(), {nChannel}).WriteRaster(&oBlock);
-        };
-        oAppend(*RasterOf(oValues));
-        oAppend(*RasterOf(oClasses));
+        Append(*poKordsk, *RasterOf(oValues));
+        Append(*poKordsk, *RasterOf(oClasses));
         return oFile;
+    }
+    static void Append(datasources::IRasterDataset& oDataset, const tessel::Raster& oBlock)
+    {
+        const unsigned int nChannel = oDataset.CreateChannels(oBlock);
+        datasources::BasicWriter(&oDataset, {nChannel}).WriteRaster(&oBlock);
     }
 
     template <class TValue, class TClass>
@@ -202,22 +202,43 @@ constexpr bool kServed = (std::is_same_v<TValue, float> || std::is_same_v<TValue
                           (std::is_same_v<TClass, unsigned char> || std::is_same_v<TClass, float> ||
                            std::is_same_v<TClass, short>));
 
+// One file with a channel of values and one of classes for each type.
 TEST_F(HomStatistics, ServesSomePairsOfTypesAlone)
 {
+    std::string oFile = moFolder.File("types");
+    {
+        const Kordsk poKordsk = NewKordsk(oFile);
+        ForEachElementType(
+            [&]<class T>()
+            {
+                Append(*poKordsk, *RasterOf(Image<T>{{9}}));
+                Append(*poKordsk, *RasterOf(Image<T>{{3}}));
+            });
+    }
     int nServed = 0;
+    unsigned int nValues = 1;
+    const auto oTest = [&]<class TValue, class TClass>(unsigned int nClasses)
+    {
+        const int nExpected = kServed<TValue, TClass> ? 9 : 0;
+        for (const unsigned int nMode : {kMean, kMode})
+        {
+            HOMStatistics oStatistics(oFile, {nValues}, {nClasses}, {}, {nMode}, {0}, {0});
+            oStatistics.GetRasterStats();
+            EXPECT_EQ(oStatistics.GetMeanMode()[3], nExpected) << nValues << ", " << nClasses;
+        }
+        nServed += kServed<TValue, TClass> ? 1 : 0;
+    };
     ForEachElementType(
         [&]<class TValue>()
         {
+            unsigned int nClasses = 2;
             ForEachElementType(
                 [&]<class TClass>()
                 {
-                    const std::vector<int> vnTable =
-                        Table(Image<TValue>{{9}}, Image<TClass>{{3}}, kMean);
-                    constexpr bool bServed = kServed<TValue, TClass>;
-                    EXPECT_EQ(vnTable[3], bServed ? 9 : 0);
-                    EXPECT_EQ(Table(Image<TValue>{{9}}, Image<TClass>{{3}}, kMode), vnTable);
-                    nServed += bServed ? 1 : 0;
+                    oTest.template operator()<TValue, TClass>(nClasses);
+                    nClasses += 2;
                 });
+            nValues += 2;
         });
     EXPECT_EQ(nServed, 15);
 }
@@ -272,6 +293,29 @@ TEST_F(HomStatistics, PassesTheErrorsOfTheReaderOn)
         });
     EXPECT_EQ(MessageOf<IOException>([&] { Statistics(oBroken, kMode).GetRasterStats(); }),
               "memory: broken");
+}
+
+// 20 MiB of values in rows of half a MiB: single precision keeps what the order of the rows makes.
+TEST_F(HomStatistics, SumsLargeImagesInTheOrderOfTheirRows)
+{
+    constexpr std::size_t kWidth = 1U << 17;
+    Random oRandom(32);
+    std::vector<float> vfValues(kWidth * 40);
+    std::vector<float> vfSums(2);
+    for (std::size_t i = 0; i < vfValues.size(); ++i)
+    {
+        vfValues[i] = static_cast<float>(oRandom() % 100000) / 7;
+        vfSums[i % 2] += vfValues[i];
+    }
+    std::vector<U8> vnClasses(vfValues.size());
+    for (std::size_t i = 1; i < vnClasses.size(); i += 2)
+    {
+        vnClasses[i] = 1;
+    }
+    const auto fCount = static_cast<float>(kWidth * 20);
+    EXPECT_EQ(Table(Image<float>(kWidth, vfValues), Image<U8>(kWidth, vnClasses), kMean),
+              Entries(256, {{0, static_cast<int>(vfSums[0] / fCount + 0.5)},
+                            {1, static_cast<int>(vfSums[1] / fCount + 0.5)}}));
 }
 
 // The definition, on random classes and values with a few hundred pixels each.

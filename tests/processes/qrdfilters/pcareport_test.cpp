@@ -121,6 +121,19 @@ bool Has(const std::string& oText, const std::string& oPart)
     return oText.find(oPart) != std::string::npos;
 }
 
+// Sixteen numbers fill a line; the seventeenth and the thirty-third start another one.
+TEST(PcaReport, StartsALineBeforeEverySixteenthNumberAfterTheFirst)
+{
+    const std::string oIndent(17, ' ');
+    EXPECT_TRUE(Has(Printed(Statistics(Counted(1, 16, 1)), "SHORT", 16, 0), "  15  16\n\n"));
+    const std::string oText = Printed(Statistics(Counted(1, 33, 1)), "SHORT", 33, 0);
+    EXPECT_TRUE(Has(oText, "  15  16\n" + oIndent + "  17  18"));
+    EXPECT_TRUE(Has(oText, "  31  32\n" + oIndent + "  33\n\n"));
+    // Lines of outputs and components stand a blank further in.
+    EXPECT_TRUE(Has(Printed(Statistics({1}, Counted(1, 17, 1), Counted(2, 17, 1)), "SHORT", 1, 17),
+                    "  16\n" + oIndent + "   17\n Eigenchannels  :   2"));
+}
+
 TEST(PcaReport, LeavesTheWindowOutBesideASegment)
 {
     PCAStatistics oStatistics = Statistics({1});

@@ -48,7 +48,7 @@ TEST_P(CovarianceSums, EachSumGrowsPixelByPixel)
                 vdfExpected[i] += pPixel[i];
                 for (std::size_t j = i; j < nChannels; ++j)
                 {
-                    vdfExpected[(1 + j - i) * nRow + i] += pPixel[i] * pPixel[j];
+                    vdfExpected[(1 + j) * nRow + i] += pPixel[i] * pPixel[j];
                 }
             }
         }
@@ -56,11 +56,11 @@ TEST_P(CovarianceSums, EachSumGrowsPixelByPixel)
         for (std::size_t i = 0; i < nChannels; ++i)
         {
             EXPECT_TRUE(test::SameSample(vdfSums[i], vdfExpected[i]));
-            for (std::size_t d = 0; i + d < nChannels; ++d)
+            for (std::size_t j = i; j < nChannels; ++j)
             {
-                const std::size_t k = (1 + d) * nRow + i;
+                const std::size_t k = (1 + j) * nRow + i;
                 ASSERT_TRUE(test::SameSample(vdfSums[k], vdfExpected[k]))
-                    << nChannels << " channels, " << i << " times " << i + d;
+                    << nChannels << " channels, " << i << " times " << j;
             }
         }
     }

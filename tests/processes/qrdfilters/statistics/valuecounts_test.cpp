@@ -1,4 +1,4 @@
-#include "processes/qrdfilters/valuecounts.h"
+#include "processes/qrdfilters/statistics/valuecounts.h"
 
 #include <gtest/gtest.h>
 

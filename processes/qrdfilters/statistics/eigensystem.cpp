@@ -1,4 +1,4 @@
-#include "processes/qrdfilters/eigensystem.h"
+#include "processes/qrdfilters/statistics/eigensystem.h"
 
 #include <algorithm>
 #include <cmath>
