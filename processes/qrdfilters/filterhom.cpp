@@ -91,6 +91,9 @@ void WriteValues(std::span<const std::uint32_t> oIndices, std::span<const int> o
     }
 }
 
+/// What is read where there are no channels: 0 in all types.
+alignas(double) constexpr unsigned char kNoSample[sizeof(double)] = {};
+
 using IndexRow = void (*)(const unsigned char*, std::size_t, std::span<std::uint32_t>);
 using ValueRow = void (*)(std::span<const std::uint32_t>, std::span<const int>, unsigned char*,
                           std::size_t);
@@ -102,6 +105,10 @@ public:
     void Process(Raster* poRasterIn, Mask* /*poMaskIn*/, Raster* poRasterOut) const override
     {
         RequireSameSize(*poRasterIn, *poRasterOut, kSource);
+        if (poRasterOut->mnChannels == 0)
+        {
+            return;
+        }
         std::array<std::uint32_t, 1024> anIndices;
         const std::size_t nStrideIn = ElementsPerPixel(*poRasterIn);
         const std::size_t nStrideOut = ElementsPerPixel(*poRasterOut);
@@ -112,7 +119,8 @@ public:
                 const std::size_t nCount = std::min(anIndices.size(), poRasterIn->mnWidth - x);
                 const std::span<std::uint32_t> oIndices(anIndices.data(), nCount);
                 const auto nX = static_cast<std::int64_t>(x);
-                mpfnIndices(poRasterIn->GetPixel(nX, y), nStrideIn, oIndices);
+                mpfnIndices(nStrideIn != 0 ? poRasterIn->GetPixel(nX, y) : kNoSample, nStrideIn,
+                            oIndices);
                 mpfnValues(oIndices, mvMeanMode, poRasterOut->GetPixel(nX, y), nStrideOut);
             }
         }
