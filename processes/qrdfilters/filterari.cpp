@@ -26,6 +26,8 @@ namespace
 
 constexpr const char* kSource = "processes/qrdfilters/filterari";
 
+constexpr const char* kNoValues = "You have to Set the values before calling Process.";
+
 // Pixels that are worked on at a time: their values stay in the first-level cache.
 constexpr std::size_t kChunk = 1024;
 constexpr std::size_t kFloat = typedispatch::ElementPosition<float>();
@@ -447,8 +449,9 @@ void ARIAlgorithm::SetValues(std::vector<unsigned int> vnOper, std::vector<float
 
 void ARIAlgorithm::ProcessBlock(Raster* poRasterIn, Raster* poRasterOut) const
 {
+    Require(mpoFilter != nullptr, kNoValues, __PRETTY_FUNCTION__, __LINE__);
     std::unique_ptr<Mask> poMask;
-    if (mpoFilter != nullptr && mpoMaskBuilder != nullptr && poRasterIn != nullptr)
+    if (mpoMaskBuilder != nullptr && poRasterIn != nullptr)
     {
         poMask.reset(mpoMaskBuilder->BuildMask(*poRasterIn));
     }
@@ -457,8 +460,7 @@ void ARIAlgorithm::ProcessBlock(Raster* poRasterIn, Raster* poRasterOut) const
 
 void ARIAlgorithm::Process(Raster* poRasterIn, Mask* poMaskIn, Raster* poRasterOut) const
 {
-    Require(mpoFilter != nullptr, "You have to Set the values before calling Process.",
-            __PRETTY_FUNCTION__, __LINE__);
+    Require(mpoFilter != nullptr, kNoValues, __PRETTY_FUNCTION__, __LINE__);
     mpoFilter->Process(poRasterIn, poMaskIn, poRasterOut);
 }
 

@@ -22,9 +22,19 @@ namespace
 
 constexpr const char* kSource = "processes/qrdfilters/filterclr";
 
+constexpr const char* kNoValues = "You have to Set the values before calling Process.";
+
 constexpr std::uint32_t kBandRows = 64;
 // Bytes that are copied at a time: they stay in the first-level cache.
 constexpr std::size_t kBrushBytes = 4096;
+
+void Require(bool bHolds, const char* pszMessage, const char* pszFunction, unsigned int nLine)
+{
+    if (!bHolds)
+    {
+        throw Exception(pszMessage, kSource, pszFunction, nLine);
+    }
+}
 
 /// Cuts nCount samples of one type to another one.
 using CutRow = void (*)(const void* pIn, void* pOut, std::size_t nCount);
@@ -171,10 +181,7 @@ FilterClr::FilterClr(std::vector<double> vdfValues)
 
 void FilterClr::Process(Raster* poRasterIn, Mask* poMask, Raster* poRasterOut) const
 {
-    if (poRasterOut == nullptr)
-    {
-        throw Exception("poRasterOut is NULL", kSource, __PRETTY_FUNCTION__, __LINE__);
-    }
+    Require(poRasterOut != nullptr, "poRasterOut is NULL", __PRETTY_FUNCTION__, __LINE__);
     Raster* const poInput = poRasterIn != nullptr ? poRasterIn : poRasterOut;
     SelectProcessor<InnerProcessor, details::ClrParams>(poInput->moDataType,
                                                         poRasterOut->moDataType, *this)
@@ -188,8 +195,9 @@ void CLRAlgorithm::SetValues(std::vector<double> vdfValues)
 
 void CLRAlgorithm::ProcessBlock(Raster* poRasterIn, Raster* poRasterOut) const
 {
+    Require(mpoFilter != nullptr, kNoValues, __PRETTY_FUNCTION__, __LINE__);
     std::unique_ptr<Mask> poMask;
-    if (mpoFilter != nullptr && mpoMaskBuilder != nullptr && poRasterIn != nullptr)
+    if (mpoMaskBuilder != nullptr && poRasterIn != nullptr)
     {
         poMask.reset(mpoMaskBuilder->BuildMask(*poRasterIn));
     }
@@ -198,11 +206,7 @@ void CLRAlgorithm::ProcessBlock(Raster* poRasterIn, Raster* poRasterOut) const
 
 void CLRAlgorithm::Process(Raster* poRasterIn, Mask* poMask, Raster* poRasterOut) const
 {
-    if (mpoFilter == nullptr)
-    {
-        throw Exception("You have to Set the values before calling Process.", kSource,
-                        __PRETTY_FUNCTION__, __LINE__);
-    }
+    Require(mpoFilter != nullptr, kNoValues, __PRETTY_FUNCTION__, __LINE__);
     mpoFilter->Process(poRasterIn, poMask, poRasterOut);
 }
 

@@ -80,14 +80,18 @@ void FindIndices(const unsigned char* pIn, std::size_t nStride, std::span<std::u
     }
 }
 
+/// What is read where there are no channels: 0 in all types.
+alignas(double) constexpr unsigned char kNoSample[sizeof(double)] = {};
+
 using IndexRow = void (*)(const unsigned char*, std::size_t, std::span<std::uint32_t>);
 
 constexpr std::size_t kBytes = 256;
 
 /// A run of samples in memory, so many elements apart.
+template <class TByte>
 struct Run
 {
-    unsigned char* mpFirst;
+    TByte* mpFirst;
     std::size_t mnStride;
     std::size_t mnCount;
 };
@@ -98,9 +102,11 @@ class StoredTable
 public:
     virtual ~StoredTable() = default;
     /// The value for each index to oOut.
-    virtual void WriteByIndex(const std::uint32_t* pIndices, const Run& oOut) const = 0;
+    virtual void WriteByIndex(const std::uint32_t* pIndices,
+                              const Run<unsigned char>& oOut) const = 0;
     /// The same for samples of one byte, for which the indices are known.
-    virtual void WriteByBytes(const Run& oIn, const Run& oOut) const = 0;
+    virtual void WriteByBytes(const Run<const unsigned char>& oIn,
+                              const Run<unsigned char>& oOut) const = 0;
 };
 
 template <class TOut>
@@ -117,7 +123,7 @@ public:
         }
     }
 
-    void WriteByIndex(const std::uint32_t* pIndices, const Run& oOut) const override
+    void WriteByIndex(const std::uint32_t* pIndices, const Run<unsigned char>& oOut) const override
     {
         TOut* const pOut = reinterpret_cast<TOut*>(oOut.mpFirst);
         for (std::size_t i = 0; i < oOut.mnCount; ++i)
@@ -126,7 +132,8 @@ public:
         }
     }
 
-    void WriteByBytes(const Run& oIn, const Run& oOut) const override
+    void WriteByBytes(const Run<const unsigned char>& oIn,
+                      const Run<unsigned char>& oOut) const override
     {
         TOut* const pOut = reinterpret_cast<TOut*>(oOut.mpFirst);
         if (oIn.mnStride == 1 && oOut.mnStride == 1)
@@ -168,12 +175,18 @@ public:
     void Process(Raster* poRasterIn, Mask* /*poMaskIn*/, Raster* poRasterOut) const override
     {
         RequireSameSize(*poRasterIn, *poRasterOut, kSource);
+        if (poRasterOut->mnChannels == 0)
+        {
+            return;
+        }
         std::call_once(moTableMade, [this] { MakeStoredTable(); });
+        const std::size_t nStrideIn = ElementsPerPixel(*poRasterIn);
+        const std::size_t nStrideOut = ElementsPerPixel(*poRasterOut);
         for (std::uint32_t y = 0; y < poRasterIn->mnHeight; ++y)
         {
-            MapRow(
-                {poRasterIn->GetPixel(0, y), ElementsPerPixel(*poRasterIn), poRasterIn->mnWidth},
-                {poRasterOut->GetPixel(0, y), ElementsPerPixel(*poRasterOut), poRasterIn->mnWidth});
+            MapRow({nStrideIn != 0 ? poRasterIn->GetPixel(0, y) : kNoSample, nStrideIn,
+                    poRasterIn->mnWidth},
+                   {poRasterOut->GetPixel(0, y), nStrideOut, poRasterIn->mnWidth});
         }
     }
 
@@ -205,7 +218,7 @@ private:
         mpoTable = mpfnMakeTable(mvMeanMode, anIndices);
     }
 
-    void MapRow(const Run& oIn, const Run& oOut) const
+    void MapRow(const Run<const unsigned char>& oIn, const Run<unsigned char>& oOut) const
     {
         if (mnInBytes == 1)
         {

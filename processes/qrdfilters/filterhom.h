@@ -107,7 +107,8 @@ protected:
 ///          several channels the first one is written, of complex samples its real part. Margins
 ///          are not written.
 /// Masks    poMask has no effect: every pixel is mapped.
-/// Corners  an index outside the table, as of a negative sample, gives 0.
+/// Corners  an index outside the table, as of a negative sample, gives 0. Without channels the
+///          input reads 0.
 /// Errors   kor::Exception "poRasterIn is invalid pointer", "poRasterOut is invalid pointer",
 ///          "Invalid type to dispatch." (eDT_BIT), all before anything is written; in hardened
 ///          builds also for blocks of different sizes.

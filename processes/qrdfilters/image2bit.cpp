@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cmath>
 #include <cstdint>
+#include <cstring>
 #include <limits>
 #include <optional>
 #include <span>
@@ -215,19 +216,40 @@ void ClearMasked(std::span<const unsigned char> oValid, std::size_t nChannels,
     }
 }
 
+/// Puts the samples of pixels at pFrom into pixels of another size: those of the channels that both
+/// have, and zeros in all channels of masked pixels. oValid has 1 or 0 a pixel.
+void SpreadPixels(const unsigned char* pFrom, std::size_t nFromBytes,
+                  std::span<const unsigned char> oValid, unsigned char* pOut, std::size_t nOutBytes)
+{
+    const std::size_t nCopied = std::min(nFromBytes, nOutBytes);
+    for (std::size_t x = 0; x < oValid.size() && nOutBytes != 0; ++x)
+    {
+        if (oValid[x] == 0)
+        {
+            std::memset(pOut + x * nOutBytes, 0, nOutBytes);
+        }
+        else if (nCopied != 0)
+        {
+            std::memcpy(pOut + x * nOutBytes, pFrom + x * nFromBytes, nCopied);
+        }
+    }
+}
+
 void BitProcessor::Process(Raster* poRasterIn, Mask* poMaskIn, Raster* poRasterOut) const
 {
     const Raster& oIn = *poRasterIn;
     const Raster& oOut = *poRasterOut;
-    RequireMatchingBlocks(oIn, poMaskIn, oOut, nullptr, kSource);
+    RequireMatchingSizes(oIn, poMaskIn, oOut, nullptr, kSource);
     RequireTypes(oIn, oOut);
     const std::size_t nChunk =
         std::max<std::size_t>(kChunkSamples / std::max<std::size_t>(oIn.mnChannels, 1), 1);
     const std::size_t nPixelBytesIn = oIn.mnChannels * oIn.moDataType.GetSampleBytes();
-    const std::size_t nPixelBytesOut = oIn.mnChannels * oOut.moDataType.GetSampleBytes();
+    const std::size_t nStoredBytes = oIn.mnChannels * moOut.GetSampleBytes();
+    const std::size_t nPixelBytesOut = oOut.mnChannels * moOut.GetSampleBytes();
     BlockFlags oFlags(*this, oIn);
     std::vector<unsigned char> vFlags(nChunk * oIn.mnChannels);
-    std::vector<unsigned char> vValid(nChunk);
+    std::vector<unsigned char> vValid(nChunk, 1);
+    std::vector<unsigned char> vStored(nPixelBytesOut != nStoredBytes ? nChunk * nStoredBytes : 0);
     for (std::uint32_t y = 0; y < oIn.mnHeight; ++y)
     {
         for (std::size_t x = 0; x < oIn.mnWidth; x += nChunk)
@@ -240,9 +262,15 @@ void BitProcessor::Process(Raster* poRasterIn, Mask* poMaskIn, Raster* poRasterO
                 poMaskIn->ExpandRow(static_cast<std::int64_t>(x), y, {vValid.data(), nPixels});
                 ClearMasked({vValid.data(), nPixels}, oIn.mnChannels, oPart);
             }
+            unsigned char* const pOut = oOut.GetPixel(0, y) + x * nPixelBytesOut;
+            const bool bSpreads = nPixelBytesOut != nStoredBytes;
             details::ConvertRow(typedispatch::ElementPosition<unsigned char>(), mnOut,
-                                vFlags.data(), oOut.GetPixel(0, y) + x * nPixelBytesOut,
-                                oPart.size());
+                                vFlags.data(), bSpreads ? vStored.data() : pOut, oPart.size());
+            if (bSpreads)
+            {
+                SpreadPixels(vStored.data(), nStoredBytes, {vValid.data(), nPixels}, pOut,
+                             nPixelBytesOut);
+            }
         }
     }
 }

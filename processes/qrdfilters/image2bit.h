@@ -41,10 +41,11 @@ protected:
 ///
 /// Input    any of the ten real types, or a complex one of such parts. re * re + im * im has the
 ///          type of the parts, in which integers wrap: parts of 16 bits give a v of 16 bits.
-/// Output   any of the ten real types, which hold 1 or 0; same width, height and channels. Margins
-///          are not written.
-/// Mask     may be null. It has the geometry of the input. Masked pixels become 0 in all channels,
-///          on whichever side of the thresholds they are.
+/// Output   any of the ten real types, which hold 1 or 0; same width and height, and the channels
+///          of the input. Channels that only one of both has are left alone. Margins are not
+///          written.
+/// Mask     may be null. It has the geometry of the input. Masked pixels become 0 in all channels
+///          of the output, on whichever side of the thresholds they are.
 /// Corners  not a number is on neither side and gives 0. 32-bit and 64-bit integers and doubles are
 ///          rounded before they are compared: 16777217 counts as 16777216.
 /// Errors   kor::Exception "poRasterIn is invalid pointer", "poRasterOut is invalid pointer",

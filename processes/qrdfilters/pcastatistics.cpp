@@ -41,7 +41,8 @@ public:
         : mnType(nType),
           mnChannels(nChannels),
           mnRow(kernels::CovarianceRow(nChannels)),
-          mnMostPixels(std::max(kFewestPixels, kBufferSamples / nChannels)),
+          mnMostPixels(
+              std::max(kFewestPixels, kBufferSamples / std::max<std::size_t>(nChannels, 1))),
           mvdfSums((nChannels + 1) * mnRow),
           mvdfPixels(mnMostPixels * nChannels + kernels::kPixelPadding)
     {

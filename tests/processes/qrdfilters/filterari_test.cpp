@@ -553,8 +553,9 @@ TEST(ARIAlgorithm, AsksForValuesFirst)
     {
         EXPECT_EQ(oError.GetMessage(), "You have to Set the values before calling Process.");
         EXPECT_EQ(oError.GetFile(), "processes/qrdfilters/filterari");
-        EXPECT_NE(oError.GetFunction().find("ARIAlgorithm::Process"), std::string::npos);
+        EXPECT_NE(oError.GetFunction().find("ARIAlgorithm::ProcessBlock("), std::string::npos);
     }
+    EXPECT_THROW(oAlgorithm.Process(poOut.get(), nullptr, poOut.get()), Exception);
     EXPECT_EQ(oBuilder.mnCalls, 0);
     oAlgorithm.SetValues({1}, {}, {}, {}, {});
     EXPECT_THROW(oAlgorithm.ProcessBlock(nullptr, poOut.get()), Exception);

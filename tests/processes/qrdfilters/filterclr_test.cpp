@@ -349,8 +349,9 @@ TEST(CLRAlgorithm, AsksForValuesFirst)
     {
         EXPECT_EQ(oError.GetMessage(), "You have to Set the values before calling Process.");
         EXPECT_EQ(oError.GetFile(), "processes/qrdfilters/filterclr");
-        EXPECT_NE(oError.GetFunction().find("CLRAlgorithm::Process"), std::string::npos);
+        EXPECT_NE(oError.GetFunction().find("CLRAlgorithm::ProcessBlock("), std::string::npos);
     }
+    EXPECT_THROW(oAlgorithm.Process(poOut.get(), nullptr, poOut.get()), Exception);
     EXPECT_EQ(oBuilder.mnCalls, 0);
 }
 

@@ -91,6 +91,20 @@ TEST(FilterHOM, ReadsAndWritesTheFirstOfSeveralChannels)
     EXPECT_EQ(ImageOf<U8>(*poOut), (Image<U8>{{5, 0xA5, 0xA5, 6, 0xA5, 0xA5, 7, 0xA5, 0xA5}}));
 }
 
+// A channel that is not there reads 0 and is not written.
+TEST(FilterHOM, TakesBlocksWithoutPixelsOrChannels)
+{
+    const FilterHOM oFilter = FilterOf({5, 6, 7});
+    const auto poNone = BlankRaster(3, 2, 0, tessel::eDT_64R);
+    const auto poOut = BlankRaster(3, 2, 1, tessel::eDT_8U);
+    oFilter.Process(poNone.get(), nullptr, poOut.get());
+    EXPECT_EQ(ImageOf<U8>(*poOut), (Image<U8>{{5, 5, 5}, {5, 5, 5}}));
+    oFilter.Process(poOut.get(), nullptr, poNone.get());
+    const auto poNoPixels = BlankRaster(0, 2, 1, tessel::eDT_8U, Margins{1, 1});
+    oFilter.Process(poNoPixels.get(), nullptr, poNoPixels.get());
+    EXPECT_TRUE(SameBits(*poNoPixels, *BlankRaster(0, 2, 1, tessel::eDT_8U, Margins{1, 1})));
+}
+
 TEST(FilterHOM, TakesTheRealPartOfComplexSamples)
 {
     const auto poIn = BlankRaster(2, 1, 1, tessel::eDT_C16S);

@@ -358,6 +358,28 @@ TEST(ImageToBit, TakesWideRowsAndManyChannels)
     }
 }
 
+// Each pixel begins where the output's own channels put it; a masked one is 0 in all of them.
+TEST(ImageToBit, LeavesFurtherChannelsOfTheOutputAloneButForMaskedPixels)
+{
+    const auto poMask = MaskOf({{1, 1, 0}});
+    const auto oFiltered =
+        [](const Bytes& oImage, std::uint32_t nIn, std::uint32_t nOut, Mask* poBy)
+    {
+        const auto poIn = RasterOf(oImage, {}, nIn);
+        const auto poOut =
+            RasterOf(Image<short>(3 * nOut, std::vector<short>(3 * nOut, 7)), {}, nOut);
+        MakeFilter({5}).Process(poIn.get(), poBy, poOut.get());
+        return ImageOf<short>(*poOut);
+    };
+    EXPECT_EQ(oFiltered(Bytes{{1, 9, 1}}, 1, 3, nullptr),
+              (Image<short>{{1, 7, 7, 0, 7, 7, 1, 7, 7}}));
+    EXPECT_EQ(oFiltered(Bytes{{1, 9, 1}}, 1, 3, poMask.get()),
+              (Image<short>{{1, 7, 7, 0, 7, 7, 0, 0, 0}}));
+    EXPECT_EQ(oFiltered(Bytes{{1, 9, 9, 1, 1, 1}}, 2, 3, poMask.get()),
+              (Image<short>{{1, 0, 7, 0, 1, 7, 0, 0, 0}}));
+    EXPECT_EQ(oFiltered(Bytes{{1, 9, 9, 1, 1, 1}}, 2, 1, poMask.get()), (Image<short>{{1, 0, 0}}));
+}
+
 // Complex samples as they lie in the file: no view of them comes between.
 TEST(ImageToBit, FiltersFilesOfRealAndComplexSamples)
 {

@@ -198,6 +198,17 @@ TEST(PcaReport, LeavesLaterPagesOfAMatrixWithoutValues)
     EXPECT_TRUE(oLabelled.ends_with("             6\n\n\n\n     \n   \n\n\n\n\n")) << oLabelled;
 }
 
+// Without rows no value is printed, so that no page leaves columns less to the next one.
+TEST(PcaReport, RepeatsTheHeadOfAMatrixWithoutRows)
+{
+    const std::string oHead =
+        "                  1             2             3             4             5             "
+        "6\n"
+        "   +--------------------------------" +
+        std::string(64, '-') + "\n\n\n\n";
+    EXPECT_EQ(Matrix(1, {}, {1, 2, 3, 4, 5, 6}, {}), oHead + oHead);
+}
+
 TEST(PcaReport, PrintsNoMatrixInOtherModes)
 {
     EXPECT_EQ(Matrix(2, {1}, {1}, {1}), "");

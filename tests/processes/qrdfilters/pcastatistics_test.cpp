@@ -245,6 +245,19 @@ TEST(PcaStatsProcessor, AddsTheValidPixelsInsideTheMargins)
     EXPECT_EQ(nCount, 10);
 }
 
+TEST(PcaStatsProcessor, CountsPixelsWithoutChannels)
+{
+    const auto poRaster = BlankRaster(70, 50, 0, tessel::eDT_8U);
+    const std::unique_ptr<PCAStatistics::IStatsProcessor> poProcessor(
+        PCAStatistics::MakeStatsProcessor(poRaster->moDataType));
+    std::vector<double> vdfSums;
+    std::vector<double> vdfProducts;
+    long nCount = 1;
+    poProcessor->Process(poRaster.get(), nullptr, vdfSums, vdfProducts, nCount);
+    EXPECT_EQ(nCount, 3501);
+    EXPECT_TRUE(vdfSums.empty() && vdfProducts.empty());
+}
+
 TEST(PcaStatsProcessor, ServesTheTenRealTypesAlone)
 {
     EXPECT_EQ(
