@@ -99,7 +99,6 @@ private:
         double mdfNorth;   ///< metres north of the near range point
         double mdfDown;    ///< share of the along-track coordinate, metres
         std::vector<double> mvdfElevations;
-        std::vector<Ranges> mvoRanges;
         std::vector<std::int64_t> mvnColumns;
         std::vector<std::int32_t> mvnLines;  ///< 0 outside the image
     };
@@ -172,10 +171,9 @@ private:
                 StartSubRow(nRow, j + k, oSubRow);
                 Interpolate(oPrevious, oCurrent, oSubRow);
                 FindLines(oSubRow);
-                oSubRow.mvoRanges.resize(oSubRow.mvdfElevations.size());
                 oSubRow.mvnColumns.resize(oSubRow.mvdfElevations.size());
                 moColumns.Find(FirstSubColumn(moRun.mnBegin), oSubRow.mdfNorth,
-                               oSubRow.mvdfElevations, oSubRow.mvoRanges, oSubRow.mvnColumns);
+                               oSubRow.mvdfElevations, oSubRow.mvnColumns);
             }
             HandOn(j == 0, nBatch, oSink);
         }
@@ -260,9 +258,10 @@ private:
 
     CellCorner CornerAt(const SubRow& oSubRow, std::size_t k) const
     {
-        const Ranges& oRanges = oSubRow.mvoRanges[k];
-        return {oSubRow.mvnLines[k], oSubRow.mvnColumns[k],
-                Along(FirstSubColumn(moRun.mnBegin) + k, oSubRow),
+        const std::size_t nPlace = FirstSubColumn(moRun.mnBegin) + k;
+        const Ranges oRanges =
+            moColumns.RangesOf(nPlace, oSubRow.mdfNorth, oSubRow.mvdfElevations[k]);
+        return {oSubRow.mvnLines[k], oSubRow.mvnColumns[k], Along(nPlace, oSubRow),
                 moProjection.LookAngle(oRanges.mdfSlant, oSubRow.mvdfElevations[k]),
                 oRanges.mdfGround};
     }
