@@ -45,10 +45,12 @@ public:
         BuildColumns(oFrame.mdfSinHead);
     }
 
-    /// Bytes that the tables of columns take.
+    /// Bytes that the tables of columns take, and a row of sub-samples of one cell.
     static double GetBytes(const DemWindow& oWindow, int nOversampling)
     {
-        return 3.0 * sizeof(double) * static_cast<double>(oWindow.mnWidth) *
+        constexpr double kTables = 3.0;
+        constexpr double kRows = 8.0;
+        return (kTables * static_cast<double>(oWindow.mnWidth) + kRows) * sizeof(double) *
                std::max(nOversampling, 1);
     }
 
