@@ -100,6 +100,12 @@ public:
         return (mbMeridional ? moView.mfSideSign : mdfTangent) * dfArc;
     }
 
+    /// What EarthAngle adds, to a rounding, for one unit of the term; for one of dfNorth less.
+    double AnglePerTerm() const
+    {
+        return kInvEarthRadius * (mbMeridional ? 1.0 : moView.mfSideSign / mdfRoot);
+    }
+
     /// Earth central angle from nadir; dfNorth metres north of the near range point.
     double EarthAngle(double dfColumnTerm, double dfNorth) const
     {

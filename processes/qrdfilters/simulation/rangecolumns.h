@@ -5,6 +5,7 @@
 #include <span>
 #include <vector>
 
+#include "processes/qrdfilters/simulation/columnestimate.h"
 #include "processes/qrdfilters/simulation/projection.h"
 #include "processes/qrdfilters/simulation/scanframe.h"
 
@@ -18,7 +19,10 @@ class RangeColumns
 {
 public:
     RangeColumns(const Projection<kDivision>& oProjection, const RadarGrid& oGrid)
-        : moProjection(oProjection), moGrid(oGrid)
+        : moProjection(oProjection),
+          moGrid(oGrid),
+          moEstimate(oProjection.GetView(), oGrid, oProjection.AnglePerTerm()),
+          mbEstimates(moEstimate.IsUsable() && !oProjection.IsAlongChord())
     {
     }
 
@@ -43,30 +47,44 @@ public:
         return {dfSlant, moProjection.GroundRange(dfSlant)};
     }
 
-    /// Columns count from 1 in the image; others lie outside.
-    std::int64_t ColumnOf(double dfGround) const
-    {
-        const std::int64_t nColumn =
-            Truncated((dfGround - moGrid.mdfNearRange) * moGrid.mdfPerRange + 1.0 + 0.5);
-        return moGrid.mbMirror ? moGrid.mnPixels - nColumn : nColumn;
-    }
-
-    /// Of points at the places from nFirst on.
+    /// Of points at the places from nFirst on. Columns count from 1 in the image; others lie
+    /// outside.
     void Find(std::size_t nFirst, double dfNorth, std::span<const double> oElevations,
-              std::span<Ranges> oRanges, std::span<std::int64_t> oColumns) const
+              std::span<std::int64_t> oColumns)
     {
+        mvdfPlaces.resize(oElevations.size());
+        mvdfMargins.resize(oElevations.size());  // zeros where nothing is estimated
+        if (mbEstimates)
+        {
+            moEstimate.Find(std::span(mvdfTerms).subspan(nFirst, oElevations.size()),
+                            moProjection.IsMeridional() ? 0.0 : dfNorth, oElevations, mvdfPlaces,
+                            mvdfMargins);
+        }
         for (std::size_t k = 0; k < oElevations.size(); ++k)
         {
-            oRanges[k] = RangesOf(nFirst + k, dfNorth, oElevations[k]);
-            oColumns[k] = ColumnOf(oRanges[k].mdfGround);
+            const std::int64_t nColumn =
+                mvdfMargins[k] > 0.0
+                    ? static_cast<std::int64_t>(mvdfPlaces[k])
+                    : ColumnAt(RangesOf(nFirst + k, dfNorth, oElevations[k]).mdfGround);
+            oColumns[k] = moGrid.mbMirror ? moGrid.mnPixels - nColumn : nColumn;
         }
     }
 
 private:
+    /// Before it is mirrored.
+    std::int64_t ColumnAt(double dfGround) const
+    {
+        return Truncated((dfGround - moGrid.mdfNearRange) * moGrid.mdfPerRange + 1.0 + 0.5);
+    }
+
     Projection<kDivision> moProjection;
     RadarGrid moGrid;
+    ColumnEstimate moEstimate;
+    bool mbEstimates;
     std::vector<double> mvdfTerms;
     std::vector<double> mvdfCosines;  ///< of the earth central angle, where places tell it
+    std::vector<double> mvdfPlaces;
+    std::vector<double> mvdfMargins;
 };
 
 }  // namespace kor::filters::simulation

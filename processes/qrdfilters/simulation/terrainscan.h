@@ -45,10 +45,12 @@ public:
         BuildColumns(oFrame.mdfSinHead);
     }
 
-    /// Bytes that the tables of columns take.
+    /// Bytes that the tables of columns take, and a row of sub-samples of one cell.
     static double GetBytes(const DemWindow& oWindow, int nOversampling)
     {
-        return 3.0 * sizeof(double) * static_cast<double>(oWindow.mnWidth) *
+        constexpr double kTables = 3.0;
+        constexpr double kRows = 8.0;
+        return (kTables * static_cast<double>(oWindow.mnWidth) + kRows) * sizeof(double) *
                std::max(nOversampling, 1);
     }
 
@@ -99,7 +101,6 @@ private:
         double mdfNorth;   ///< metres north of the near range point
         double mdfDown;    ///< share of the along-track coordinate, metres
         std::vector<double> mvdfElevations;
-        std::vector<Ranges> mvoRanges;
         std::vector<std::int64_t> mvnColumns;
         std::vector<std::int32_t> mvnLines;  ///< 0 outside the image
     };
@@ -172,10 +173,9 @@ private:
                 StartSubRow(nRow, j + k, oSubRow);
                 Interpolate(oPrevious, oCurrent, oSubRow);
                 FindLines(oSubRow);
-                oSubRow.mvoRanges.resize(oSubRow.mvdfElevations.size());
                 oSubRow.mvnColumns.resize(oSubRow.mvdfElevations.size());
                 moColumns.Find(FirstSubColumn(moRun.mnBegin), oSubRow.mdfNorth,
-                               oSubRow.mvdfElevations, oSubRow.mvoRanges, oSubRow.mvnColumns);
+                               oSubRow.mvdfElevations, oSubRow.mvnColumns);
             }
             HandOn(j == 0, nBatch, oSink);
         }
@@ -260,9 +260,10 @@ private:
 
     CellCorner CornerAt(const SubRow& oSubRow, std::size_t k) const
     {
-        const Ranges& oRanges = oSubRow.mvoRanges[k];
-        return {oSubRow.mvnLines[k], oSubRow.mvnColumns[k],
-                Along(FirstSubColumn(moRun.mnBegin) + k, oSubRow),
+        const std::size_t nPlace = FirstSubColumn(moRun.mnBegin) + k;
+        const Ranges oRanges =
+            moColumns.RangesOf(nPlace, oSubRow.mdfNorth, oSubRow.mvdfElevations[k]);
+        return {oSubRow.mvnLines[k], oSubRow.mvnColumns[k], Along(nPlace, oSubRow),
                 moProjection.LookAngle(oRanges.mdfSlant, oSubRow.mvdfElevations[k]),
                 oRanges.mdfGround};
     }
