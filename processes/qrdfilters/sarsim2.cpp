@@ -24,6 +24,8 @@ constexpr const char* kSource = "processes/qrdfilters/sarsim2";
 constexpr std::size_t kFloat = typedispatch::ElementPosition<float>();
 constexpr std::size_t kDouble = typedispatch::ElementPosition<double>();
 constexpr auto kDivision = Division::eReciprocal;
+/// What the rows of one run take for each column of the window: samples, elevations, results.
+constexpr std::size_t kRowBytes = 3 * sizeof(double) + 2 * sizeof(float) + 2;
 
 /// Where the samples go that one run makes.
 struct Writers
@@ -203,6 +205,7 @@ public:
     {
         moWindow = WindowOf(moParams.Dbiw);
         RequireWindow(moWindow, moReader, kSource);
+        RequireRowMemory(moWindow, kRowBytes);
         mvdfRow.resize(static_cast<std::size_t>(moWindow.mnWidth));
         mvfPrevious.resize(mvdfRow.size());
         mvfCurrent.resize(mvdfRow.size());

@@ -522,6 +522,8 @@ TEST(SarSim1, RefusesImagesThatCannotBe)
     EXPECT_NE(oTooLarge.find(" GiB of memory; the machine has "), std::string::npos) << oTooLarge;
     const std::string oOversampled = oMessage([](In& o) { o.Oversamp = {2147483647}; });
     EXPECT_NE(oOversampled.find(" GiB of memory"), std::string::npos) << oOversampled;
+    const std::string oTooWide = oMessage([](In& o) { o.Dbiw = {0, 0, 2147483647, 1}; });
+    EXPECT_EQ(oTooWide.find("A DEM window of 2147483647 columns needs "), 0U) << oTooWide;
     EXPECT_NE(oMessage([](In& o) { o.Minlook = {89.0}; }).find("a radar image of "),
               std::string::npos);
     EXPECT_NE(oMessage(

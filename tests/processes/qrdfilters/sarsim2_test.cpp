@@ -662,6 +662,8 @@ TEST(Sarsim2, RefusesImagesThatCannotBe)
     using In = SimulationInput;
     EXPECT_NE(oMessage([](In& o) { o.Oversamp = {2147483647}; }).find(" GiB of memory"),
               std::string::npos);
+    const std::string oTooWide = oMessage([](In& o) { o.Dbiw = {0, 0, 2147483647, 1}; });
+    EXPECT_EQ(oTooWide.find("A DEM window of 2147483647 columns needs "), 0U) << oTooWide;
     EXPECT_NE(oMessage([](In& o) { o.Minlook = {89.0}; }).find("a radar image of "),
               std::string::npos);
     EXPECT_NE(oMessage([](In& o) { o.Head = {std::nan("")}; }).find("nan lines"),
