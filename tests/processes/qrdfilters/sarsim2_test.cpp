@@ -648,6 +648,22 @@ TEST(Sarsim2, StaysInItsTablesWhateverTheParameters)
     oMaps.Fill(oNarrow, oSimulator);
 }
 
+// Without cells there are no hits, and 0 is divided by the largest count of 0.
+TEST(Sarsim2, ASingleColumnHasCountsOfZeroAndNoNumbersForEightBits)
+{
+    MemoryDataset oDem = DemOf<std::int16_t>(1, 3, kSeaLevel);
+    SimulationInput oInput = InputFor(oDem);
+    oInput.Head = {0.0};
+    EXPECT_EQ(Simulated<double>(oDem, oInput), (Image<double>{{0}, {0}, {0}}));
+    MemoryDataset oBytes = DemOf<unsigned char>(1, 3, kSeaLevel);
+    const Image<float> oRoots = Simulated<float>(oBytes, oInput);
+    for (const float fRoot : oRoots.Samples())
+    {
+        EXPECT_TRUE(std::isnan(fRoot)) << fRoot;
+    }
+    EXPECT_EQ(Simulated<unsigned char>(oBytes, oInput), (Image<unsigned char>{{0}, {0}, {0}}));
+}
+
 TEST(Sarsim2, RefusesImagesThatCannotBe)
 {
     MemoryDataset oDem = DemOf<std::int16_t>(400, 400, kSeaLevel);
