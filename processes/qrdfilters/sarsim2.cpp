@@ -39,7 +39,7 @@ struct Writers
 using Store = void (*)(std::span<const double> oResults, unsigned char* pSamples);
 
 /// Floating point is narrowed, integers are cut to their width without rounding; what is not a
-/// number gives 0 there.
+/// number gives 0 there, and so does infinity. Numbers are less than 2^16 * 255.
 template <class TOut>
 void StoreCut(std::span<const double> oResults, unsigned char* pSamples)
 {
@@ -52,7 +52,7 @@ void StoreCut(std::span<const double> oResults, unsigned char* pSamples)
         }
         else
         {
-            const bool bNumber = oResults[i] == oResults[i];
+            const bool bNumber = std::isfinite(oResults[i]);
             pOut[i] = static_cast<TOut>(bNumber ? static_cast<std::int64_t>(oResults[i]) : 0);
         }
     }

@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cmath>
 
 #include "platform/datasources/basicwriter.h"
@@ -646,6 +647,21 @@ TEST(Sarsim2, StaysInItsTablesWhateverTheParameters)
     Maps<float> oMaps(oNarrow);
     Sarsim2 oSimulator = MapSimulatorOf(oInput);
     oMaps.Fill(oNarrow, oSimulator);
+}
+
+// The very last of 513 x 513 sub-samples turns a counter from 65535 to 0, which replaces the
+// largest count of -1.
+TEST(Sarsim2, ALargestCountThatEndsAtZeroGivesInfinityAndZeroAsInteger)
+{
+    MemoryDataset oDem = DemOf<unsigned char>(2, 2, kSeaLevel);
+    SimulationInput oInput = InputFor(oDem);
+    oInput.Escale = {0.0, 0.0};
+    oInput.Head = {90.0};
+    oInput.Oversamp = {512};
+    const Image<float> oRoots = Simulated<float>(oDem, oInput);
+    const auto& vfRoots = oRoots.Samples();
+    EXPECT_TRUE(std::any_of(vfRoots.begin(), vfRoots.end(), [](float f) { return std::isinf(f); }));
+    EXPECT_EQ(Simulated<std::int64_t>(oDem, oInput), (Image<std::int64_t>{{0, 0}, {0, 0}}));
 }
 
 // Without cells there are no hits, and 0 is divided by the largest count of 0.
