@@ -1,7 +1,7 @@
 #include "platform/network/genericprocessor.h"
 
 #include <algorithm>
-#include <atomic>
+#include <condition_variable>
 #include <mutex>
 
 #include "platform/system/omp.h"
@@ -205,11 +205,7 @@ public:
         // Without a team, a function has all threads for one of its own.
         [[maybe_unused]] const int nTeam = std::clamp(mnBranches, 1, OMPGetMaxThreads());
 #pragma omp parallel num_threads(nTeam) if (nTeam > 1)
-#pragma omp single
-        for (const std::size_t nNode : mvnFirst)
-        {
-            Start(nNode);
-        }
+        Work();
         if (moFailure)
         {
             std::rethrow_exception(moFailure);
@@ -257,64 +253,63 @@ private:
             mnBranches = std::max(mnBranches, ++vnWidths[vnLevels[nNode]]);
             if (Entries()[nNode].mnAwaited == 0)
             {
-                mvnFirst.push_back(nNode);
+                mvnReady.push_back(nNode);
             }
         }
+        std::reverse(mvnReady.begin(), mvnReady.end());  // the last is taken first
+        mvnReady.reserve(mvnNeeded.size());              // no allocation between threads
     }
 
-    /// Makes a task of a node.
-    void Start(std::size_t nNode)
+    /// What each thread of the team does: runs nodes that are ready until there can be no more.
+    /// Not tasks: beyond some number the runtime runs them at once, each inside the one that made
+    /// it, and a long chain would fill the stack. No error leaves it.
+    void Work()
     {
-#pragma omp task firstprivate(nNode)
-        RunFrom(nNode);
-    }
-
-    /// Runs a node, and goes on with one that waited for nothing but its result; others of those
-    /// become tasks.
-    void RunFrom(std::size_t nNode)
-    {
-        std::vector<std::size_t> vnReady = RunNode(nNode);
-        while (!vnReady.empty())
+        std::unique_lock oLock(moMutex);
+        while (true)
         {
-            std::for_each(vnReady.begin() + 1, vnReady.end(),
-                          [this](std::size_t nOther) { Start(nOther); });
-            vnReady = RunNode(vnReady.front());
+            moChanged.wait(oLock,
+                           [this] { return moFailure || mnRunning == 0 || !mvnReady.empty(); });
+            if (moFailure || mvnReady.empty())
+            {
+                return;
+            }
+            Entry& oEntry = Entries()[mvnReady.back()];
+            mvnReady.pop_back();
+            ++mnRunning;
+            oLock.unlock();
+            boost::any oResult;
+            const std::exception_ptr oFailure = CallNode(oEntry, oResult);
+            oLock.lock();
+            --mnRunning;
+            Finish(oEntry, std::move(oResult), oFailure);
+            moChanged.notify_all();
         }
     }
 
-    /// Returns the nodes that can run now. No error leaves it.
-    std::vector<std::size_t> RunNode(std::size_t nNode)
+    /// Returns what the node's function threw, else null.
+    std::exception_ptr CallNode(const Entry& oEntry, boost::any& oResult) const
     {
-        if (mbFailed)
-        {
-            return {};
-        }
-        Entry& oEntry = Entries()[nNode];
-        boost::any oResult;
-        std::exception_ptr oFailure;
         try
         {
             oResult = moProcessor.Call(oEntry);
+            return nullptr;
         }
         catch (...)
         {
-            oFailure = std::current_exception();
+            return std::current_exception();
         }
-        return Finish(oEntry, std::move(oResult), oFailure);
     }
 
-    std::vector<std::size_t> Finish(Entry& oEntry, boost::any oResult,
-                                    const std::exception_ptr& oFailure)
+    /// Keeps what came of a node, and makes ready those that waited for nothing else.
+    void Finish(Entry& oEntry, boost::any oResult, const std::exception_ptr& oFailure)
     {
-        std::vector<std::size_t> vnReady;
-        const std::scoped_lock oLock(moMutex);
         if (oFailure)
         {
             oEntry.moNode.mnState = eS_Failed;
             oEntry.moFailure = oFailure;
             moFailure = moFailure ? moFailure : oFailure;
-            mbFailed = true;
-            return vnReady;
+            return;
         }
         oEntry.moResult = std::move(oResult);
         oEntry.moNode.mnState = eS_Done;
@@ -323,19 +318,19 @@ private:
         {
             if (--Entries()[nFollower].mnAwaited == 0)
             {
-                vnReady.push_back(nFollower);
+                mvnReady.push_back(nFollower);
             }
         }
-        return vnReady;
     }
 
     GenericProcessor& moProcessor;
     std::vector<std::size_t> mvnNeeded;
-    std::vector<std::size_t> mvnFirst;  ///< those that can run at once
-    int mnBranches = 0;                 ///< the most that can run side by side
-    std::mutex moMutex;                 ///< guards the entries and the failure
+    int mnBranches = 0;  ///< the most that can run side by side
+    std::mutex moMutex;  ///< guards the entries and all below
+    std::condition_variable moChanged;
+    std::vector<std::size_t> mvnReady;  ///< those that wait for nothing, the next one last
+    int mnRunning = 0;
     std::exception_ptr moFailure;
-    std::atomic<bool> mbFailed = false;
 };
 
 boost::any GenericProcessor::Evaluate(std::uint64_t nId)

@@ -25,6 +25,8 @@ namespace
 constexpr const char* kSource = "processes/qrdfilters/sarsim1";
 
 constexpr std::int64_t kMostSlots = 10000;  ///< buffer rows that are given out to lines
+/// What the rows of one run take for each column of the window.
+constexpr std::size_t kRowBytes = sizeof(std::int16_t) + 2 * sizeof(float) + 1;
 constexpr std::int64_t kMostLines = 65536;  ///< lines that a buffer row can be looked up for
 
 /// Cut to a 16-bit integer.
@@ -189,6 +191,7 @@ public:
         RequireParameters();
         moWindow = WindowOf(moParams.Dbiw);
         RequireWindow(moWindow, moReader, kSource);
+        RequireRowMemory(moWindow, kRowBytes);
         // One sample more than the window: the test for background reads it.
         mvnRow.resize(static_cast<std::size_t>(moWindow.mnWidth) + 1);
         mvfPrevious.resize(static_cast<std::size_t>(moWindow.mnWidth));

@@ -24,6 +24,8 @@ constexpr const char* kSource = "processes/qrdfilters/sarsim2";
 constexpr std::size_t kFloat = typedispatch::ElementPosition<float>();
 constexpr std::size_t kDouble = typedispatch::ElementPosition<double>();
 constexpr auto kDivision = Division::eReciprocal;
+/// What the rows of one run take for each column of the window: samples, elevations, results.
+constexpr std::size_t kRowBytes = 3 * sizeof(double) + 2 * sizeof(float) + 2;
 
 /// Where the samples go that one run makes.
 struct Writers
@@ -37,7 +39,7 @@ struct Writers
 using Store = void (*)(std::span<const double> oResults, unsigned char* pSamples);
 
 /// Floating point is narrowed, integers are cut to their width without rounding; what is not a
-/// number gives 0 there.
+/// number gives 0 there, and so does infinity. Numbers are less than 2^16 * 255.
 template <class TOut>
 void StoreCut(std::span<const double> oResults, unsigned char* pSamples)
 {
@@ -50,7 +52,7 @@ void StoreCut(std::span<const double> oResults, unsigned char* pSamples)
         }
         else
         {
-            const bool bNumber = oResults[i] == oResults[i];
+            const bool bNumber = std::isfinite(oResults[i]);
             pOut[i] = static_cast<TOut>(bNumber ? static_cast<std::int64_t>(oResults[i]) : 0);
         }
     }
@@ -203,6 +205,7 @@ public:
     {
         moWindow = WindowOf(moParams.Dbiw);
         RequireWindow(moWindow, moReader, kSource);
+        RequireRowMemory(moWindow, kRowBytes);
         mvdfRow.resize(static_cast<std::size_t>(moWindow.mnWidth));
         mvfPrevious.resize(mvdfRow.size());
         mvfCurrent.resize(mvdfRow.size());

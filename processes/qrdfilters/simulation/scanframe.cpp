@@ -3,6 +3,9 @@
 #include <cmath>
 #include <limits>
 
+#include "platform/system/memory.h"
+#include "processes/qrdfilters/simulation/linemaxima.h"
+
 namespace kor::filters::simulation
 {
 
@@ -40,6 +43,13 @@ void RequireWindow(const DemWindow& oWindow, const datasources::IRasterReader& o
                                      (bHoldsPixels ? oRows : "a window holds one pixel at least"),
                                  pszSource, __PRETTY_FUNCTION__, __LINE__);
     }
+}
+
+void RequireRowMemory(const DemWindow& oWindow, std::size_t nBytes)
+{
+    RequireMemory(LineMaxima::GetBytes(oWindow.mnWidth) +
+                      static_cast<double>(nBytes) * static_cast<double>(oWindow.mnWidth),
+                  "A DEM window of " + std::to_string(oWindow.mnWidth) + " columns");
 }
 
 ScanOrder::ScanOrder(double dfHeading, const DemWindow& oWindow)

@@ -65,6 +65,10 @@ std::uint32_t ChannelBits(const datasources::IRasterReader& oReader, const char*
 void RequireWindow(const DemWindow& oWindow, const datasources::IRasterReader& oReader,
                    const char* pszSource);
 
+/// Throws kor::Exception when rows as wide as the window, of nBytes a column, and the maxima of its
+/// lines take more memory than the machine has: a window may be wider than the image.
+void RequireRowMemory(const DemWindow& oWindow, std::size_t nBytes);
+
 /// Rows and columns count from 1: rows in the dataset, columns in the window.
 struct ScanOrder
 {

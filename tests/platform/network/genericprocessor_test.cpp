@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <atomic>
 #include <chrono>
 #include <thread>
@@ -225,6 +226,40 @@ TEST(GenericProcessor, RunsLongChainsAndWideNetworks)
         return boost::any(nSum);
     };
     EXPECT_EQ(IntOf(oProcessor.Evaluate(oProcessor.Add(oSumUp, vnBranches, ""))), 500500);
+}
+
+// Nodes of a chain that each feed a side branch too, when many others are ready already: how deep
+// the network is must not count for the stack.
+TEST(GenericProcessor, RunsLongChainsWithSideBranchesBesideManyOthers)
+{
+    for (const int nThreads : {1, 3})
+    {
+        const test::ThreadCount oThreads(nThreads);
+        GenericProcessor oProcessor;
+        const auto oOne = [](boost::any&) { return boost::any(1); };
+        const auto oAddOne = [](boost::any& oValue) { return boost::any(IntOf(oValue) + 1); };
+        std::vector<std::uint64_t> vnBranches;
+        for (int i = 0; i < 1000; ++i)
+        {
+            vnBranches.push_back(oProcessor.Add(oOne, {}, ""));
+        }
+        std::uint64_t nLast = oProcessor.Add(oOne, {}, "");
+        for (int i = 0; i < 50000; ++i)
+        {
+            nLast = oProcessor.Add(oAddOne, {nLast}, "");
+            vnBranches.push_back(oProcessor.Add(oAddOne, {nLast}, ""));
+        }
+        const auto oLargest = [](boost::any& oValue)
+        {
+            int nLargest = 0;
+            for (const auto& oPart : boost::any_cast<details::Arguments&>(oValue))
+            {
+                nLargest = std::max(nLargest, IntOf(oPart.get()));
+            }
+            return boost::any(nLargest);
+        };
+        EXPECT_EQ(IntOf(oProcessor.Evaluate(oProcessor.Add(oLargest, vnBranches, ""))), 50002);
+    }
 }
 
 TEST(GenericProcessor, PassesOnWhatAFunctionThrowsAndStartsNothingBehindIt)

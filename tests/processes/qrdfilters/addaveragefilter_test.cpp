@@ -113,6 +113,17 @@ TEST(AddAverageFilter, PassesTheMasksAndTheBackground)
               (Image<double>{{6, 75.0 / 8.0}}));
 }
 
+// The output mask takes nothing out of the windows.
+TEST(AddAverageFilter, TheOutputMaskMakesBackgroundAlone)
+{
+    Network oNetwork(SharedRaster(Picture<unsigned char>()));
+    oNetwork.mnMaskOut = oNetwork.moProcessor.AddValue(
+        MaskPointer(test::MaskOf({{1, 1, 1, 1}, {1, 0, 1, 1}, {1, 1, 1, 1}}, {1, 1})));
+    EXPECT_EQ(test::ImageOf<unsigned char>(
+                  *oNetwork.Result(oNetwork.Add(3, 3, tessel::eDT_8U, kUnspecified))),
+              (Image<unsigned char>{{0, 9}}));
+}
+
 TEST(AddAverageFilter, RefusesARasterInPlaceOfAMask)
 {
     Network oNetwork(SharedRaster(Picture<double>()));

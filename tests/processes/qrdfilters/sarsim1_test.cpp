@@ -146,6 +146,44 @@ TEST(SarSim1, AnOffsetOfZeroBecomesTheLowestSampleButNotOfBytes)
     EXPECT_EQ(Simulated(oBytes, InputFor(oBytes)).mvdfEscale, (std::vector<double>{1.0, 0.0}));
 }
 
+// Of four rows, the first and the third are sampled for the range of elevations, which takes scale
+// and offset whole; the second may hold anything. Its samples take 2 and 5000: (5000 + 5000) * 2 is
+// 20000, and so is (5000 - 27768) * 2 = -45536 in 16 bits.
+TEST(SarSim1, ElevationsAreScaledByCutFactorsAndWrapAt16Bits)
+{
+    const auto oImageOf = [](int nSample)
+    {
+        MemoryDataset oDem = DemOf<std::int16_t>(6, 4,
+                                                 [=](std::uint32_t, std::uint32_t y)
+                                                 {
+                                                     const int anRows[] = {11000, nSample, 0, 0};
+                                                     return anRows[y];
+                                                 });
+        SimulationInput oInput = InputFor(oDem);
+        oInput.Escale = {2.9, 5000.9};
+        oInput.Head = {0.0};
+        return Simulated(oDem, oInput).mvnImage;
+    };
+    EXPECT_EQ(oImageOf(5000), oImageOf(-27768));
+    EXPECT_NE(oImageOf(5000), oImageOf(6000));
+}
+
+TEST(SarSim1, ASingleRowOrColumnHasNoCells)
+{
+    const std::pair<std::uint32_t, std::uint32_t> kSizes[] = {{1, 6}, {6, 1}, {1, 1}};
+    for (const auto& [nWidth, nHeight] : kSizes)
+    {
+        MemoryDataset oDem = DemOf<std::int16_t>(nWidth, nHeight, kSeaLevel);
+        for (const double dfHeading : {0.0, 180.0, 300.0})
+        {
+            SimulationInput oInput = InputFor(oDem);
+            oInput.Head = {dfHeading};
+            EXPECT_EQ(Sum(Simulated(oDem, oInput).mvnImage), 0U)
+                << nWidth << " x " << nHeight << ", " << dfHeading;
+        }
+    }
+}
+
 /// A processed simulator over a plain.
 SarSim1 Processed(const SimulationInput& oInput, MemoryDataset& oDem)
 {
@@ -522,6 +560,8 @@ TEST(SarSim1, RefusesImagesThatCannotBe)
     EXPECT_NE(oTooLarge.find(" GiB of memory; the machine has "), std::string::npos) << oTooLarge;
     const std::string oOversampled = oMessage([](In& o) { o.Oversamp = {2147483647}; });
     EXPECT_NE(oOversampled.find(" GiB of memory"), std::string::npos) << oOversampled;
+    const std::string oTooWide = oMessage([](In& o) { o.Dbiw = {0, 0, 2147483647, 1}; });
+    EXPECT_EQ(oTooWide.find("A DEM window of 2147483647 columns needs "), 0U) << oTooWide;
     EXPECT_NE(oMessage([](In& o) { o.Minlook = {89.0}; }).find("a radar image of "),
               std::string::npos);
     EXPECT_NE(oMessage(

@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cmath>
 
 #include "platform/datasources/basicwriter.h"
@@ -648,6 +649,37 @@ TEST(Sarsim2, StaysInItsTablesWhateverTheParameters)
     oMaps.Fill(oNarrow, oSimulator);
 }
 
+// The very last of 513 x 513 sub-samples turns a counter from 65535 to 0, which replaces the
+// largest count of -1.
+TEST(Sarsim2, ALargestCountThatEndsAtZeroGivesInfinityAndZeroAsInteger)
+{
+    MemoryDataset oDem = DemOf<unsigned char>(2, 2, kSeaLevel);
+    SimulationInput oInput = InputFor(oDem);
+    oInput.Escale = {0.0, 0.0};
+    oInput.Head = {90.0};
+    oInput.Oversamp = {512};
+    const Image<float> oRoots = Simulated<float>(oDem, oInput);
+    const auto& vfRoots = oRoots.Samples();
+    EXPECT_TRUE(std::any_of(vfRoots.begin(), vfRoots.end(), [](float f) { return std::isinf(f); }));
+    EXPECT_EQ(Simulated<std::int64_t>(oDem, oInput), (Image<std::int64_t>{{0, 0}, {0, 0}}));
+}
+
+// Without cells there are no hits, and 0 is divided by the largest count of 0.
+TEST(Sarsim2, ASingleColumnHasCountsOfZeroAndNoNumbersForEightBits)
+{
+    MemoryDataset oDem = DemOf<std::int16_t>(1, 3, kSeaLevel);
+    SimulationInput oInput = InputFor(oDem);
+    oInput.Head = {0.0};
+    EXPECT_EQ(Simulated<double>(oDem, oInput), (Image<double>{{0}, {0}, {0}}));
+    MemoryDataset oBytes = DemOf<unsigned char>(1, 3, kSeaLevel);
+    const Image<float> oRoots = Simulated<float>(oBytes, oInput);
+    for (const float fRoot : oRoots.Samples())
+    {
+        EXPECT_TRUE(std::isnan(fRoot)) << fRoot;
+    }
+    EXPECT_EQ(Simulated<unsigned char>(oBytes, oInput), (Image<unsigned char>{{0}, {0}, {0}}));
+}
+
 TEST(Sarsim2, RefusesImagesThatCannotBe)
 {
     MemoryDataset oDem = DemOf<std::int16_t>(400, 400, kSeaLevel);
@@ -662,6 +694,8 @@ TEST(Sarsim2, RefusesImagesThatCannotBe)
     using In = SimulationInput;
     EXPECT_NE(oMessage([](In& o) { o.Oversamp = {2147483647}; }).find(" GiB of memory"),
               std::string::npos);
+    const std::string oTooWide = oMessage([](In& o) { o.Dbiw = {0, 0, 2147483647, 1}; });
+    EXPECT_EQ(oTooWide.find("A DEM window of 2147483647 columns needs "), 0U) << oTooWide;
     EXPECT_NE(oMessage([](In& o) { o.Minlook = {89.0}; }).find("a radar image of "),
               std::string::npos);
     EXPECT_NE(oMessage([](In& o) { o.Head = {std::nan("")}; }).find("nan lines"),
