@@ -191,6 +191,17 @@ TEST(FilterCustom, KeepsTheKernelOfItsFirstBlock)
     EXPECT_EQ(Filtered<int>(oFilter, oImage, {}), (Image<int>{{21}}));
 }
 
+TEST(FilterCustom, KeepsTheBackgroundOfItsFirstBlock)
+{
+    FilterCustom oFilter = CustomFilter({2.0}, 1, 1);
+    const Image<int> oImage = {{7, 8}};
+    const auto poMask = MaskOf({{0, 1}});
+    EXPECT_EQ(Filtered<int>(oFilter, oImage, {}, poMask.get()), (Image<int>{{7, 16}}));
+    oFilter.SetBGZero(true);
+    EXPECT_EQ(Filtered<int>(oFilter, oImage, {}, poMask.get()), (Image<int>{{7, 16}}));
+    EXPECT_EQ(Filtered<short>(oFilter, oImage, {}, poMask.get()), (Image<short>{{0, 16}}));
+}
+
 void ExpectSizeRefused(const std::function<void()>& oAction)
 {
     try
@@ -278,6 +289,26 @@ TEST(FilterCustom, RefusesToWorkWithoutAKernel)
 {
     ExpectMarginRefused(FilterCustom(), {9, 9});
     ExpectMarginRefused(CustomFilter({}, 0, 5), {9, 9});
+}
+
+// The processor was made before the margins were looked at, and it keeps the kernel of then: none.
+TEST(FilterCustom, StaysWithoutAKernelForTheTypesThatItWasCalledWith)
+{
+    FilterCustom oFilter;
+    ExpectMarginRefused(oFilter, {1, 1});
+    oFilter.SetKernel({1.0}, 1, 1);
+    ExpectMarginRefused(oFilter, {1, 1});
+    EXPECT_EQ(Filtered<int>(oFilter, Image<int>{{7}}, {}), (Image<int>{{7}}));
+}
+
+TEST(FilterCustom, LooksAtTheSizeOfTheKernelBeforeTheMargins)
+{
+    FilterCustom oFilter = CustomFilter(std::vector<double>(9, 1.0), 3, 3);
+    ExpectSizeRefused([&] { oFilter.SetKernel({1, 2}, 3, 3); });
+    ExpectSizeRefused([&] { Filtered<int>(oFilter, Image<int>{{7}}, {}); });
+    // A kernel whose size was refused is forgotten with the next one that fits.
+    oFilter.SetKernel({3.0}, 1, 1);
+    EXPECT_EQ(Filtered<int>(oFilter, Image<int>{{7}}, {}), (Image<int>{{21}}));
 }
 
 void ExpectRefused(tessel::Raster* poIn, tessel::Raster* poOut, const std::string& oMessage)

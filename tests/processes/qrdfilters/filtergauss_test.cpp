@@ -210,7 +210,23 @@ TEST(FilterGauss, RefusesVariancesOutOfRange)
     ExpectRefusedSigma(2.0, 33.0, kSecond);
     ExpectRefusedSigma(2.0, std::nan(""), kSecond);
     ExpectRefusedSigma(0.0, 33.0, kSecond);
-    ExpectRefusedSigma(0.0, 2.0, "mdfSigmasq2 is defined but mdfSigmasq1 is not defined");
+    const std::string kSecondAlone = "mdfSigmasq2 is defined but mdfSigmasq1 is not defined";
+    ExpectRefusedSigma(0.0, 2.0, kSecondAlone);
+    // A variance counts as defined from 2^-52 on, and is out of range then.
+    ExpectRefusedSigma(0x1.fffffffffffffp-53, 0.0, kNeither);
+    ExpectRefusedSigma(0x1p-52, 0.0, kFirst);
+    ExpectRefusedSigma(-0x1p-52, 0.0, kFirst);
+    ExpectRefusedSigma(2.0, 0x1p-52, kSecond);
+    ExpectRefusedSigma(0x1.fffffffffffffp-53, 2.0, kSecondAlone);
+}
+
+TEST(FilterGauss, SmoothsWithOneKernelWhereTheSecondVarianceIsNotDefined)
+{
+    const Image<double> oImage = SinglePixel(5, 2, 1, 10.0, 1.0);
+    const double dfExpected = FilteredPixel(FilterGauss(2.0, 0.0), oImage);
+    EXPECT_GT(dfExpected, 1.0);
+    EXPECT_EQ(FilteredPixel(FilterGauss(2.0, 0x1.fffffffffffffp-53), oImage), dfExpected);
+    EXPECT_EQ(FilteredPixel(FilterGauss(2.0, -1e-17), oImage), dfExpected);
 }
 
 TEST(FilterGauss, KeepsItsKernelsWhenVariancesAreRefused)
@@ -220,6 +236,13 @@ TEST(FilterGauss, KeepsItsKernelsWhenVariancesAreRefused)
     const double dfExpected = FilteredPixel(oFilter, oImage);
     EXPECT_THROW(oFilter.SetSigma(4.0, 0.5), ParameterException);
     EXPECT_EQ(FilteredPixel(oFilter, oImage), dfExpected);
+    // Both of them, where there were two.
+    FilterGauss oBand(2.0, 1.0);
+    const Image<double> oLarger = SinglePixel(5, 2, 2, 10.0, 1.0);
+    const double dfBand = FilteredPixel(oBand, oLarger);
+    EXPECT_NE(dfBand, FilteredPixel(FilterGauss(2.0, 0.0), oLarger));
+    EXPECT_THROW(oBand.SetSigma(0.5, 0.0), ParameterException);
+    EXPECT_EQ(FilteredPixel(oBand, oLarger), dfBand);
 }
 
 TEST(FilterGauss, KeepsVariancesThatWereRefused)

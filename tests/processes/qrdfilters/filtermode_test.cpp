@@ -487,6 +487,21 @@ TEST(FilterMode, RefusesRastersThatAreNotThereAndComplexOutput)
     ExpectRefused(poComplex.get(), poComplex.get(), "Output cannot be complex");
 }
 
+// The processor of the first block is still there: what was set since does not count.
+TEST(FilterMode, KeepsItsProcessorWhenComplexOutputIsRefused)
+{
+    FilterMode oFilter;
+    const Image<std::uint8_t> oImage = {{1, 9, 1}};
+    EXPECT_EQ(Mode(oImage, {1, 0}, oFilter), 1);
+    oFilter.SetKeepValues({9});
+    const auto poIn = RasterOf(oImage, {1, 0});
+    const auto poComplex = BlankRaster(1, 1, 1, tessel::eDT_C32R);
+    EXPECT_EQ(MessageOf<Exception>(
+                  [&] { oFilter.Process(poIn.get(), nullptr, poComplex.get(), nullptr); }),
+              "Output cannot be complex");
+    EXPECT_EQ(Mode(oImage, {1, 0}, oFilter), 1);
+}
+
 TEST(FilterMode, RefusesTypesWithoutSamples)
 {
     const auto poReal = BlankRaster(1, 1, 1, tessel::eDT_8U);

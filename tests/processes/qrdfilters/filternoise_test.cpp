@@ -101,6 +101,18 @@ TEST(FilterNoise, BackgroundIsZeroOrTheInput)
               (Image<double>{{1.5, 0, 0}}));
 }
 
+TEST(FilterNoise, WritesTheBackgroundOfAllChannels)
+{
+    const Image<double> oImage = {{1, 2, 3, 4, 5, 6, 7, 14}};
+    const auto poClip = MaskOf({{0, 1}});
+    FilterNoise oFilter;
+    EXPECT_EQ(Filtered(oFilter, oImage, {1, 0}, nullptr, poClip.get(), 2),
+              (Image<double>{{3, 4, 5, 8}}));
+    oFilter.SetBGZero(true);
+    EXPECT_EQ(Filtered(oFilter, oImage, {1, 0}, nullptr, poClip.get(), 2),
+              (Image<double>{{0, 0, 5, 8}}));
+}
+
 TEST(FilterNoise, LeavesMaskedPixelsOutOfEveryWindow)
 {
     const auto poMask = MaskOf({{1, 1, 0, 1, 1}}, {1, 0});

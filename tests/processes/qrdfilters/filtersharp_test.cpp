@@ -112,6 +112,18 @@ TEST(FilterSharp, WritesBackgroundWhereNothingIsComputed)
               (Image<double>{{0, 12, 0}}));
 }
 
+TEST(FilterSharp, WritesTheBackgroundOfAllChannels)
+{
+    const auto poMaskOut = MaskOf({{0, 1}});
+    const Image<double> oImage = {{1, 2, 3, 4, 5, 6, 7, 14}};
+    FilterSharp oFilter;
+    EXPECT_EQ(Filtered(oFilter, oImage, {1, 0}, nullptr, poMaskOut.get(), 2),
+              (Image<double>{{3, 4, 5, 4}}));
+    oFilter.SetBGZero(true);
+    EXPECT_EQ(Filtered(oFilter, oImage, {1, 0}, nullptr, poMaskOut.get(), 2),
+              (Image<double>{{0, 0, 5, 4}}));
+}
+
 // Beside 2^53 a 1 is lost: a sum that slides on from there is one too small for good, and one that
 // begins anew behind the background pixel is not.
 TEST(FilterSharp, BeginsItsSumsAnewBehindABackgroundPixel)

@@ -119,6 +119,20 @@ TEST(FilterSobel, WritesZeroWhereNothingIsComputed)
               (Image<double>{{3, 40, 40, 10}}));
 }
 
+TEST(FilterSobel, WritesTheBackgroundOfAllChannels)
+{
+    const Image<double> oImage = {
+        {0, 5, 0, 6, 10, 5, 10, 5},
+        {0, 5, 3, 6, 10, 5, 10, 5},
+        {0, 5, 0, 6, 10, 5, 10, 5},
+    };
+    const auto poMaskOut = MaskOf({{0, 0}});
+    EXPECT_EQ(Filtered(FilterSobel(1.0, false), oImage, {1, 1}, nullptr, poMaskOut.get(), 2),
+              (Image<double>{{3, 6, 10, 5}}));
+    EXPECT_EQ(Filtered(FilterSobel(1.0, true), oImage, {1, 1}, nullptr, poMaskOut.get(), 2),
+              (Image<double>{{0, 0, 0, 0}}));
+}
+
 TEST(FilterSobel, TakesBothParametersInTheOrderOfSetParameters)
 {
     const auto poMaskOut = MaskOf({{1, 1, 1, 0}});
