@@ -37,9 +37,9 @@ protected:
 /// Output   any of the ten real types; same width, height and channels. The strength is stored by
 ///          the library's conversion rules. Margins are not written.
 /// Masks    may be null. The input mask has the geometry of the input; a pixel cleared in it is
-/// left
-///          out of every window, while the divisor stays: beside masked pixels edges are weaker.
-///          That is meant. A bit cleared in either mask makes the pixel 0; nothing is ever kept.
+///          left out of every window, while the divisor stays: beside masked pixels edges are
+///          weaker. That is meant. A bit cleared in either mask makes the pixel 0; nothing is ever
+///          kept.
 /// Corners  a sum below 1e-9 gives 0; margins of 0 give 0. A NaN in the window gives NaN, 0 in
 ///          integers.
 /// Errors   kor::Exception "poRasterIn is invalid pointer", "poRasterOut is invalid pointer",

@@ -13,15 +13,14 @@ namespace kor::filters
 /// gives the absolute difference of two such smoothings, a band-pass.
 ///
 ///     K[k] = exp(-(k - m)^2 / (2 * variance)), k = 0 .. 2m, divided by the sum of all
-///     A(x) = sum over the window's rows of s(x, y) * K[y],   out = sum over its columns of A(x) *
-///     K[x]
+///     A(x) = sum over the window's rows of s(x, y) * K[y]
+///     out = sum over its columns of A(x) * K[x]
 /// m is the greater variance, cut to an integer. Mirrored samples are added before they are
 /// multiplied, from the ends of the window to its middle, in double; the weight in the middle is
 /// set so that a kernel sums to exactly 1.
 ///
 /// Input    eDT_64R; channels are filtered one by one. The window is 2m + 1 pixels wide and high:
-/// it
-///          follows from the variance itself, 4.7 gives 9 pixels and 32.0 gives 65. The margins
+///          it follows from the variance itself, 4.7 gives 9 pixels and 32.0 gives 65. The margins
 ///          must hold it, and may be deeper.
 /// Output   eDT_64R, same width, height and channels. Margins are not written.
 /// Masks    may be null. A neighbour whose bit is cleared in the input mask counts as a copy of the

@@ -54,10 +54,9 @@ protected:
 ///          samples count like all others.
 /// Thin     line mode: the window is 3 x 3 whatever the margins, and a pixel whose upper left
 ///          neighbour's value fills three or more of the nine places keeps its own.
-/// Keep     list: a sample that, as a single-precision number, lies within 1e-9 of a listed value
-/// is
-///          not changed, only converted; it still counts for its neighbours. Integers beyond 2^24
-///          may be kept by the value beside them: 16777216 keeps 16777217.
+/// Keep     list: a sample that, as a single-precision number, lies within 1e-9 of a listed value,
+///          is not changed, only converted; it still counts for its neighbours. Integers beyond
+///          2^24 may be kept by the value beside them: 16777216 keeps 16777217.
 /// Output   any of the ten real types; same width, height and channels. The mode is stored as a
 ///          double by the library's conversion rules, so that 64-bit integers above 2^53 lose their
 ///          low bits and negative ones become 0. Margins are not written.

@@ -17,7 +17,7 @@ struct Products
     template <class D>
     HWY_INLINE hn::Vec<D> Load(D oTag, std::size_t r, std::size_t i) const
     {
-        return hn::LoadU(oTag, mapRows[r] + i);
+        return LoadForManyUses(oTag, mapRows[r] + i);
     }
 
     template <class D>
@@ -32,6 +32,15 @@ struct Products
     std::size_t mnWidth;
 };
 
+struct Unchanged
+{
+    template <class D>
+    HWY_INLINE hn::Vec<D> Of(D, hn::Vec<D> oSum) const
+    {
+        return oSum;
+    }
+};
+
 void CorrelateRows(const StencilRows& oRows, std::span<const double> oKernel,
                    std::span<double* const> oOut)
 {
@@ -41,15 +50,9 @@ void CorrelateRows(const StencilRows& oRows, std::span<const double> oKernel,
         const auto oVectors = [&](auto oTag, auto kVectors, std::size_t i) HWY_ATTR
         {
             const auto oSums = SumTerms<kRows(), kVectors()>(oTag, oPart, oTerms, i);
-            for (std::size_t j = 0; j < kRows(); ++j)
-            {
-                for (std::size_t v = 0; v < kVectors(); ++v)
-                {
-                    hn::StoreU(oSums.aoSums[j][v], oTag, apOut[j] + i + v * hn::Lanes(oTag));
-                }
-            }
+            StoreSums(oTag, oSums, Unchanged(), apOut, i);
         };
-        ForEachVector(oPart.mnSamples, oVectors);
+        ForEachVector<kManyVectors>(oPart.mnSamples, oVectors);
     };
     ForEachRowGroup(oRows, oOut, oCorrelate);
 }

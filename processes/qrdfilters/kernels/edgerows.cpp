@@ -25,7 +25,7 @@ struct Differences
 
     HWY_INLINE Sample Load(D oTag, std::size_t r, std::size_t i) const
     {
-        const auto oValue = hn::LoadU(oTag, moRows.moSamples[r] + i);
+        const auto oValue = LoadForManyUses(oTag, moRows.moSamples[r] + i);
         if constexpr (kMasked)
         {
             const hn::RebindToUnsigned<D> oWordTag;
@@ -81,14 +81,7 @@ HWY_INLINE void MeanDifferences(const StencilRows& oRows, const Strength& oStren
             }
         }
         const auto oSums = SumTerms<kRows, kVectors()>(oTag, oRows, oTerms, i);
-        for (std::size_t j = 0; j < kRows; ++j)
-        {
-            for (std::size_t v = 0; v < kVectors(); ++v)
-            {
-                hn::StoreU(oStrength.Of(oTag, oSums.aoSums[j][v]), oTag,
-                           apOut[j] + i + v * hn::Lanes(oTag));
-            }
-        }
+        StoreSums(oTag, oSums, oStrength, apOut, i);
     };
     ForEachVector(oRows.mnSamples, oVectors);
 }

@@ -17,19 +17,41 @@ namespace hn = hwy::HWY_NAMESPACE;
 template <std::size_t kCount>
 using Count = std::integral_constant<std::size_t, kCount>;
 
+// Vector registers: 32, or 16.
+inline constexpr bool kManyRegisters = HWY_TARGET == HWY_AVX3 || HWY_TARGET == HWY_AVX3_DL;
+
+/// Vectors of one output row that are worked on together: in four rows as many as fill the
+/// registers.
+inline constexpr std::size_t kManyVectors = kManyRegisters ? 4 : 3;
+
+/// Samples for several uses. With many registers they stay in one: compilers would read them from
+/// memory for each use, and wide vectors that lie across cache lines are read at half the speed.
+template <class D>
+HWY_INLINE hn::Vec<D> LoadForManyUses(D oTag, const double* pSamples)
+{
+    auto oSamples = hn::LoadU(oTag, pSamples);
+#if HWY_ARCH_X86
+    if constexpr (kManyRegisters)
+    {
+        asm("" : "+v"(oSamples.raw));
+    }
+#endif
+    return oSamples;
+}
+
 /// oBody(oTag, Count<n>(), i) for all of nSamples samples, n vectors from sample i on at a time:
-/// two where the row is long enough. The last call ends with the row, and so repeats samples of the
-/// one before: output and input must not be the same.
-template <class Body>
+/// kMost where the row is long enough, else one. The last call ends with the row, and so repeats
+/// samples of the one before: output and input must not be the same.
+template <std::size_t kMost = 2, class Body>
 HWY_INLINE void ForEachVector(std::size_t nSamples, const Body& oBody)
 {
     const hn::ScalableTag<double> oTag;
     const std::size_t nLanes = hn::Lanes(oTag);
-    if (nSamples >= 2 * nLanes)
+    if (nSamples >= kMost * nLanes)
     {
-        for (std::size_t i = 0; i < nSamples; i += 2 * nLanes)
+        for (std::size_t i = 0; i < nSamples; i += kMost * nLanes)
         {
-            oBody(oTag, Count<2>(), std::min(i, nSamples - 2 * nLanes));
+            oBody(oTag, Count<kMost>(), std::min(i, nSamples - kMost * nLanes));
         }
     }
     else if (nSamples >= nLanes)
@@ -49,7 +71,8 @@ HWY_INLINE void ForEachVector(std::size_t nSamples, const Body& oBody)
 }
 
 /// Sums of one output row j, or four, that are built side by side, so that all have the use of a
-/// sample loaded once; each is added in the order of the window, row by row.
+/// sample loaded once; each is added in the order of the window, row by row. Loops over them are
+/// unrolled by order: else the compiler keeps the sums in memory from row to row.
 template <class D, std::size_t kRows, std::size_t kVectors>
 struct WindowSums
 {
@@ -65,13 +88,20 @@ HWY_INLINE void AddWindowRow(D oTag, const StencilRows& oRows, const Terms& oTer
 {
     for (std::size_t dx = 0; dx < oRows.mnWidth; ++dx, i += oRows.mnStep)
     {
+        decltype(oTerms.Load(oTag, r, i)) aoSamples[kVectors];
+        HWY_UNROLL(8)
         for (std::size_t v = 0; v < kVectors; ++v)
         {
-            const auto oSample = oTerms.Load(oTag, r, i + v * hn::Lanes(oTag));
-            for (std::size_t j = kFirst; j <= kLast; ++j)
+            aoSamples[v] = oTerms.Load(oTag, r, i + v * hn::Lanes(oTag));
+        }
+        HWY_UNROLL(8)
+        for (std::size_t j = kFirst; j <= kLast; ++j)
+        {
+            HWY_UNROLL(8)
+            for (std::size_t v = 0; v < kVectors; ++v)
             {
                 oSums.aoSums[j][v] =
-                    hn::Add(oSums.aoSums[j][v], oTerms.Term(oTag, oSample, j, v, (r - j), dx));
+                    hn::Add(oSums.aoSums[j][v], oTerms.Term(oTag, aoSamples[v], j, v, (r - j), dx));
             }
         }
     }
@@ -84,8 +114,10 @@ HWY_INLINE WindowSums<D, kRows, kVectors> SumTerms(D oTag, const StencilRows& oR
                                                    const Terms& oTerms, std::size_t i)
 {
     WindowSums<D, kRows, kVectors> oSums;
+    HWY_UNROLL(8)
     for (std::size_t j = 0; j < kRows; ++j)
     {
+        HWY_UNROLL(8)
         for (std::size_t v = 0; v < kVectors; ++v)
         {
             oSums.aoSums[j][v] = hn::Zero(oTag);
@@ -114,6 +146,23 @@ HWY_INLINE WindowSums<D, kRows, kVectors> SumTerms(D oTag, const StencilRows& oR
         AddWindowRow<3, 3>(oTag, oRows, oTerms, nHeight + 2, i, oSums);
     }
     return oSums;
+}
+
+/// Writes oFinish(sum) of all sums to the output rows from sample i on.
+template <class D, std::size_t kRows, std::size_t kVectors, class Finish>
+HWY_INLINE void StoreSums(D oTag, const WindowSums<D, kRows, kVectors>& oSums,
+                          const Finish& oFinish, double* const* apOut, std::size_t i)
+{
+    HWY_UNROLL(8)
+    for (std::size_t j = 0; j < kRows; ++j)
+    {
+        HWY_UNROLL(8)
+        for (std::size_t v = 0; v < kVectors; ++v)
+        {
+            hn::StoreU(oFinish.Of(oTag, oSums.aoSums[j][v]), oTag,
+                       apOut[j] + i + v * hn::Lanes(oTag));
+        }
+    }
 }
 
 /// oWork(Count<n>(), oPart, oOut) for all output rows, n of them at a time: four where that can be,

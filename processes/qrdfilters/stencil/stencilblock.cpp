@@ -16,8 +16,8 @@ namespace
 /// but many beside those that the windows reach over on both sides.
 std::size_t TilePixels(const StencilBlock& oBlock)
 {
-    constexpr std::size_t kCachedSamples = 3072;
-    constexpr std::size_t kVectorSamples = 16;
+    constexpr std::size_t kCachedSamples = 3328;
+    constexpr std::size_t kVectorSamples = 32;
     const std::size_t nRows = oBlock.moWindow.GetHeight() + 2 * std::size_t{oBlock.mnGroupRows};
     const std::size_t nSamples =
         std::max(oBlock.mnShortestTile, kCachedSamples / nRows / kVectorSamples * kVectorSamples);

@@ -115,14 +115,14 @@ private:
 class StencilKernels : public hwy::TestWithParamTarget
 {
 protected:
-    /// Calls oTest with rows up to three of the widest vectors long, so that every target meets
-    /// every remainder, and with one to nine of them.
+    /// Calls oTest with rows up to nine of the widest vectors long, so that every target meets
+    /// every remainder of the four that are worked on together, and with one to nine rows.
     template <class Test>
     void ForEachCase(std::span<const Window> oWindows, bool bMasked, const Test& oTest)
     {
         for (const Window oWindow : oWindows)
         {
-            for (std::size_t nSamples = 1; nSamples <= 24; ++nSamples)
+            for (std::size_t nSamples = 1; nSamples <= 72; ++nSamples)
             {
                 const std::size_t nRows = 1 + moRandom() % 9;
                 const std::size_t nStep = 1 + moRandom() % 4;
