@@ -69,7 +69,8 @@ protected:
 ///          threads at once unless it has worked on the same pair of types before.
 /// State    the processor of the last pair of types is kept, and copies of the filter share it.
 ///          Kernel and BGZero count when a processor is made: a filter that has processed a block
-///          keeps those of then until the types change.
+///          keeps those of then until the types change. So a filter that was called before it had
+///          a kernel goes on without one.
 class FilterCustom : public details::CustomParams, private ProcessorCache<IClipperProcessor>
 {
 public:

@@ -95,10 +95,10 @@ protected:
 ///          is background. Beyond 10000 lines, the rows of the image are used again and those
 ///          lines are lost. Lines that no point met stay 0. What would fall outside the image is
 ///          dropped.
-/// Errors   Process: kor::ParameterException for a list that is too short or a window that does not
-///          lie in the image; kor::Exception where no image comes of the parameters or the machine
-///          has not the memory. Output: kor::Exception before Process, and for a dataset without
-///          channels or bitmaps. Both: what the dataset throws.
+/// Errors   Process: kor::ParameterException for a list that is too short or a window that is empty
+///          or has rows outside the image; kor::Exception where no image comes of the parameters or
+///          the machine has not the memory. Output: kor::Exception before Process, and for a
+///          dataset without channels or bitmaps. Both: what the dataset throws.
 /// Threads  works on the calling thread; one object serves one thread.
 /// State    copies share the image of a processed object. Process may be called again: it makes a
 ///          new image, from NRPoint and Escale as the last call left them.

@@ -13,6 +13,7 @@ namespace kor::filters::simulation
 /// With h = 1 - cos(c), the cosine q of the ground range's angle a follows without the slant range:
 ///
 ///     1 - q = h - z (1/R - 1/O - h/R) + z^2 / (2 R O),   a = 2 asin(sqrt((1 - q) / 2))
+///
 /// h and asin by their series. The formula as it stands rounds q by less than 1e-13, and so do the
 /// series where they are used. The column is certain where the place is farther from the border
 /// between two columns than ten times as much can move it; the others are the caller's to compute.

@@ -26,6 +26,13 @@ public:
     {
     }
 
+    /// Makes room for so many places, and no more.
+    void Reserve(std::size_t nPlaces)
+    {
+        mvdfTerms.reserve(nPlaces);
+        mvdfCosines.reserve(moProjection.IsMeridional() ? nPlaces : 0);
+    }
+
     /// One more place: dfX metres east of the window's left edge.
     void Append(double dfX)
     {

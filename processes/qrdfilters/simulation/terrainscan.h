@@ -131,6 +131,12 @@ private:
     void BuildColumns(double dfSinHead)
     {
         const double dfPixelX = moProjection.GetView().mdfPixelX;
+        const auto nPlaces =
+            static_cast<std::size_t>(std::max<std::int64_t>(0, mnCells * mnOversampling + 1));
+        mvdfOffsets.reserve(
+            static_cast<std::size_t>(std::max<std::int64_t>(0, mnOversampling + 1)));
+        mvdfAcross.reserve(nPlaces);
+        moColumns.Reserve(nPlaces);
         for (std::int64_t i = 0; i <= mnOversampling; ++i)
         {
             mvdfOffsets.push_back(SubOffset(i, moOrder.mnColStep));

@@ -12,6 +12,7 @@
 #include "processes/qrdfilters/kernels/exponentialrow.h"
 #include "processes/qrdfilters/kernels/windowsums.h"
 #include "tests/support/blocks.h"
+#include "tests/support/filtered.h"
 #include "tests/support/localstatisticsreference.h"
 
 namespace kor::filters
@@ -28,16 +29,6 @@ FilterFfrost Frost(double dfDamp, bool bBGZero = false)
     oFilter.SetDamp(dfDamp);
     oFilter.SetBGZero(bBGZero);
     return oFilter;
-}
-
-Image<double> Filtered(const FilterFfrost& oFilter, const Image<double>& oImage, Margins oMargins,
-                       tessel::Mask* poMaskIn = nullptr, tessel::Mask* poMaskOut = nullptr,
-                       std::uint32_t nChannels = 1)
-{
-    const auto poIn = RasterOf(oImage, oMargins, nChannels);
-    const auto poOut = BlankRaster(poIn->mnWidth, poIn->mnHeight, nChannels, eDT_64R);
-    oFilter.Process(poIn.get(), poMaskIn, poOut.get(), poMaskOut);
-    return ImageOf<double>(*poOut);
 }
 
 /// The weighted mean of samples in the order given, and the same over exp(-(A * d)).

@@ -7,6 +7,7 @@
 
 #include "platform/exception/exception.h"
 #include "tests/support/filtercomparison.h"
+#include "tests/support/filtered.h"
 
 namespace kor::filters
 {
@@ -14,16 +15,6 @@ namespace
 {
 
 using namespace kor::test;
-
-Image<double> Filtered(const FilterGauss& oFilter, const Image<double>& oImage, Margins oMargins,
-                       tessel::Mask* poMaskIn = nullptr, tessel::Mask* poMaskOut = nullptr,
-                       std::uint32_t nChannels = 1)
-{
-    const auto poIn = RasterOf(oImage, oMargins, nChannels);
-    const auto poOut = BlankRaster(poIn->mnWidth, poIn->mnHeight, nChannels, tessel::eDT_64R);
-    oFilter.Process(poIn.get(), poMaskIn, poOut.get(), poMaskOut);
-    return ImageOf<double>(*poOut);
-}
 
 /// A block of one pixel whose margins hold windows of nSide, all samples dfBackground but the one
 /// in column x and row y.

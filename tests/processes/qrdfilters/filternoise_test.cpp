@@ -8,6 +8,7 @@
 #include "platform/exception/exception.h"
 #include "processes/qrdfilters/hardened.h"
 #include "tests/support/exceptions.h"
+#include "tests/support/filtered.h"
 #include "tests/support/plainwindows.h"
 
 namespace kor::filters
@@ -24,16 +25,6 @@ FilterNoise FailingWith(double dfFailValue)
     FilterNoise oFilter;
     oFilter.SetFailValue(dfFailValue);
     return oFilter;
-}
-
-Image<double> Filtered(const FilterNoise& oFilter, const Image<double>& oImage, Margins oMargins,
-                       Mask* poMaskIn = nullptr, Mask* poMaskOut = nullptr,
-                       std::uint32_t nChannels = 1)
-{
-    const auto poIn = RasterOf(oImage, oMargins, nChannels);
-    const auto poOut = BlankRaster(poIn->mnWidth, poIn->mnHeight, nChannels, tessel::eDT_64R);
-    oFilter.Process(poIn.get(), poMaskIn, poOut.get(), poMaskOut);
-    return ImageOf<double>(*poOut);
 }
 
 // m = 1, variance 9. At the 9: 64 > 27. At a 0: 1 is not.

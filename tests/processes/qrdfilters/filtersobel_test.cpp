@@ -4,6 +4,7 @@
 
 #include "platform/exception/exception.h"
 #include "tests/support/blocks.h"
+#include "tests/support/filtered.h"
 
 namespace kor::filters
 {
@@ -11,16 +12,6 @@ namespace
 {
 
 using namespace kor::test;
-
-Image<double> Filtered(const FilterSobel& oFilter, const Image<double>& oImage, Margins oMargins,
-                       tessel::Mask* poMaskIn = nullptr, tessel::Mask* poMaskOut = nullptr,
-                       std::uint32_t nChannels = 1)
-{
-    const auto poIn = RasterOf(oImage, oMargins, nChannels);
-    const auto poOut = BlankRaster(poIn->mnWidth, poIn->mnHeight, nChannels, tessel::eDT_64R);
-    oFilter.Process(poIn.get(), poMaskIn, poOut.get(), poMaskOut);
-    return ImageOf<double>(*poOut);
-}
 
 const Image<double> kColumnStep = {
     {0, 0, 0, 10, 10, 10},

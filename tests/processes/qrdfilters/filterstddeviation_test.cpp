@@ -8,6 +8,7 @@
 #include "platform/exception/exception.h"
 #include "processes/qrdfilters/hardened.h"
 #include "tests/support/exceptions.h"
+#include "tests/support/filtered.h"
 #include "tests/support/plainwindows.h"
 
 namespace kor::filters
@@ -18,16 +19,6 @@ namespace
 using namespace kor::test;
 using tessel::Mask;
 using tessel::Raster;
-
-Image<double> Filtered(const FilterStdDeviation& oFilter, const Image<double>& oImage,
-                       Margins oMargins, Mask* poMaskIn = nullptr, Mask* poMaskOut = nullptr,
-                       std::uint32_t nChannels = 1)
-{
-    const auto poIn = RasterOf(oImage, oMargins, nChannels);
-    const auto poOut = BlankRaster(poIn->mnWidth, poIn->mnHeight, nChannels, tessel::eDT_64R);
-    oFilter.Process(poIn.get(), poMaskIn, poOut.get(), poMaskOut);
-    return ImageOf<double>(*poOut);
-}
 
 // m = 1, Q = 81, variance (81 - 9) / 8 = 9.
 TEST(FilterStdDeviation, GivesThreeWhereverTheWindowSeesOneNineAmongZeros)
