@@ -4,6 +4,7 @@
 #include "examples/filterfile/classvalues.h"
 #include "examples/filterfile/filtertable.h"
 #include "examples/filterfile/principalcomponents.h"
+#include "examples/filterfile/sharedfilter.h"
 
 namespace kor::examples
 {
@@ -14,33 +15,18 @@ namespace
 using parallelio::FilterAlgorithm;
 using tessel::RasterInfo;
 
-/// A filter that is known only after the look at the image.
-template <class Filter>
-class LaterFilter
-{
-public:
-    void Process(tessel::Raster* poIn, tessel::Mask* poMask, tessel::Raster* poOut) const
-    {
-        mpoFilter->Process(poIn, poMask, poOut);
-    }
-    void Set(Filter oFilter) const { *mpoFilter = std::move(oFilter); }
-
-private:
-    std::shared_ptr<Filter> mpoFilter = std::make_shared<Filter>();
-};
-
 PreparedFilter MakePca(Arguments& oArguments, const RasterInfo& oIn)
 {
     const auto poComponents = std::make_shared<PrincipalComponents>(oArguments, oIn.mnChannels);
-    const LaterFilter<filters::FilterPCA> oFilter;
-    PreparedFilter oPrepared = {FilterAlgorithm(oFilter)};
+    const auto poFilter = std::make_shared<filters::FilterPCA>();
+    PreparedFilter oPrepared = {FilterAlgorithm(SharedFilter<filters::FilterPCA>(poFilter))};
     oPrepared.mnChannels = static_cast<std::uint32_t>(poComponents->GetCount());
     oPrepared.moType = tessel::eDT_32R;
     oPrepared.mbNewChannels = true;
     oPrepared.mfnLook = [=](IFirstLook& oLook)
     {
         poComponents->Analyse(oLook.GetImage(), oLook.GetOutputType());
-        oFilter.Set(poComponents->GetFilter());
+        *poFilter = poComponents->GetFilter();
     };
     return oPrepared;
 }
@@ -52,14 +38,14 @@ PreparedFilter MakeHomogenise(Arguments& oArguments, const RasterInfo& oIn)
         throw UsageError("homogenise takes one channel, of classes, such as channels=2; not " +
                          std::to_string(oIn.mnChannels));
     }
-    const LaterFilter<filters::FilterHOM> oFilter;
-    PreparedFilter oPrepared = {FilterAlgorithm(oFilter)};
+    const auto poFilter = std::make_shared<filters::FilterHOM>();
+    PreparedFilter oPrepared = {FilterAlgorithm(SharedFilter<filters::FilterHOM>(poFilter))};
     oPrepared.moType = tessel::eDT_32S;
     oPrepared.mbNewChannels = true;
-    oPrepared.mfnLook = [oFilter, oValues = ClassValues(oArguments)](IFirstLook& oLook)
+    oPrepared.mfnLook = [poFilter, oValues = ClassValues(oArguments)](IFirstLook& oLook)
     {
         const SourceImage& oImage = oLook.GetImage();
-        oFilter.Set(oValues.Find(oImage.moFile, oImage.mvnChannels[0]));
+        *poFilter = oValues.Find(oImage.moFile, oImage.mvnChannels[0]);
     };
     return oPrepared;
 }

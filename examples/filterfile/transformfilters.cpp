@@ -5,6 +5,7 @@
 #include <vector>
 
 #include "examples/filterfile/filtertable.h"
+#include "examples/filterfile/sharedfilter.h"
 #include "processes/qrdfilters/filterari.h"
 #include "processes/qrdfilters/filterclr.h"
 #include "processes/qrdfilters/filterhomogeneity.h"
@@ -22,22 +23,6 @@ using tessel::Raster;
 using tessel::RasterInfo;
 
 constexpr double kMost = std::numeric_limits<float>::max();
-
-/// A filter that is still changed by others after an algorithm was made of it.
-template <class Filter>
-class Shared
-{
-public:
-    explicit Shared(std::shared_ptr<const Filter> poFilter) : mpoFilter(std::move(poFilter)) {}
-
-    void Process(Raster* poRasterIn, Mask* poMask, Raster* poRasterOut) const
-    {
-        mpoFilter->Process(poRasterIn, poMask, poRasterOut);
-    }
-
-private:
-    std::shared_ptr<const Filter> mpoFilter;
-};
 
 /// "LOW,HIGH", the first below the second; empty without the key.
 std::vector<float> TakeLimits(Arguments& oArguments, const std::string& oKey)
@@ -139,7 +124,7 @@ PreparedFilter MakeArithmetic(Arguments& oArguments, const RasterInfo& oIn)
 
     const auto poArithmetic = std::make_shared<Arithmetic>(
         nOperator, static_cast<float>(dfConstant), static_cast<float>(dfZeroDivision), dfFill);
-    PreparedFilter oPrepared = {FilterAlgorithm(Shared<Arithmetic>(poArithmetic))};
+    PreparedFilter oPrepared = {FilterAlgorithm(SharedFilter<Arithmetic>(poArithmetic))};
     oPrepared.mnChannels = 1;
     oPrepared.mbNewChannels = true;
     if (oArguments.Has("fill"))
@@ -228,7 +213,7 @@ PreparedFilter MakeHomogeneity(Arguments& oArguments, const RasterInfo& oIn)
     const auto poFilter = std::make_shared<filters::FilterHomogeneity>();
     poFilter->SetGrey(oArguments.TakeInteger("levels", 64, 1, 255));
     PreparedFilter oPrepared = {
-        FilterAlgorithm(Shared<filters::FilterHomogeneity>(poFilter), oWindow)};
+        FilterAlgorithm(SharedFilter<filters::FilterHomogeneity>(poFilter), oWindow)};
     oPrepared.moType = tessel::eDT_32R;
     oPrepared.mbNewChannels = true;
     oPrepared.mfnLook = [poFilter](IFirstLook& oLook)

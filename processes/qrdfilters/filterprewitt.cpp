@@ -49,8 +49,8 @@ void FilterPrewitt::ProcessBlock(tessel::Raster* poRasterIn, tessel::Mask* poMas
     RequireParameter(poRasterIn->mnMarginX != 0 && poRasterIn->mnMarginY != 0, "oRasterIn",
                      "The Margin of the input raster is too small", kSource);
     RequireDoubleBlocks(*poRasterIn, poMaskIn, *poRasterOut, poMaskOut, kSource);
-    const stencil::GradientParameters oParameters{kCentreWeight, mdfFactor, mbBGZero};
-    stencil::FilterGradient(*poRasterIn, poMaskIn, *poRasterOut, poMaskOut, oParameters);
+    stencil::FilterGradient(*poRasterIn, poMaskIn, *poRasterOut, poMaskOut,
+                            {kCentreWeight, mdfFactor}, mbBGZero);
 }
 
 }  // namespace kor::filters

@@ -45,8 +45,8 @@ void FilterSobel::ProcessBlock(tessel::Raster* poRasterIn, tessel::Mask* poMaskI
     RequireParameter(poRasterIn->mnMarginX != 0 && poRasterIn->mnMarginY != 0, "oRasterIn",
                      "The Margin of the input raster is too small", kSource);
     RequireDoubleBlocks(*poRasterIn, poMaskIn, *poRasterOut, poMaskOut, kSource);
-    const stencil::GradientParameters oParameters{kCentreWeight, mdfFactor, mbBGZero};
-    stencil::FilterGradient(*poRasterIn, poMaskIn, *poRasterOut, poMaskOut, oParameters);
+    stencil::FilterGradient(*poRasterIn, poMaskIn, *poRasterOut, poMaskOut,
+                            {kCentreWeight, mdfFactor}, mbBGZero);
 }
 
 }  // namespace kor::filters

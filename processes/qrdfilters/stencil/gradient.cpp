@@ -1,6 +1,5 @@
 #include "processes/qrdfilters/stencil/gradient.h"
 
-#include "processes/qrdfilters/kernels/gradientrows.h"
 #include "processes/qrdfilters/stencil/stencilblock.h"
 
 namespace kor::filters::stencil
@@ -16,18 +15,16 @@ constexpr std::size_t kShortestTile = 8192;
 
 void FilterGradient(const tessel::Raster& oIn, const tessel::Mask* poMaskIn,
                     const tessel::Raster& oOut, const tessel::Mask* poMaskOut,
-                    const GradientParameters& oParameters)
+                    const kernels::GradientScale& oScale, bool bBGZero)
 {
     StencilBlock oBlock(oIn, poMaskIn, oOut, poMaskOut, Window{1, 1},
-                        SampleTypesOf<double, double>(oParameters.mbBGZero));
+                        SampleTypesOf<double, double>(bBGZero));
     oBlock.mnShortestTile = kShortestTile;
-    oBlock.mnGroupRows = 1;
+    oBlock.mbCoreStreams = true;
     FilterRows(oBlock, 0, oIn.mnHeight,
-               [&](const kernels::StencilRows& oRows, const StencilPlace&,
-                   std::span<double* const> oResults) {
-                   kernels::GradientRows(oRows, oParameters.mdfCentreWeight, oParameters.mdfFactor,
-                                         oResults);
-               });
+               [&](const kernels::StencilRows& oRows, const StencilPlace& oPlace,
+                   std::span<double* const> oResults)
+               { kernels::GradientRows(oRows, oScale, oResults, oPlace.mbStreamed); });
 }
 
 }  // namespace kor::filters::stencil

@@ -41,6 +41,7 @@ struct StencilBlock
     MaskedSamples meMasked = MaskedSamples::eMarked;
     std::size_t mnShortestTile = 64;  ///< samples of a row that are worked on together, at least
     std::uint32_t mnGroupRows = 4;    ///< output rows that a core is given at a time
+    bool mbCoreStreams = false;       ///< the core can write its results past the caches
 };
 
 /// Where a group of output rows stands.
@@ -50,6 +51,7 @@ struct StencilPlace
     std::int64_t y;
     /// 0 for background pixels, 1 for the others, row by row; empty where all are computed.
     std::span<const unsigned char> moComputed;
+    bool mbStreamed;  ///< the core is to write its results past the caches
 };
 
 /// Computes a group of output rows, mnSamples of each; all of moIn may be read and all of oOut

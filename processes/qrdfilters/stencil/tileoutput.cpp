@@ -24,7 +24,8 @@ TileOutput::TileOutput(const StencilBlock& oBlock, std::size_t nTilePixels)
       mbMasked(oBlock.mpoMaskIn != nullptr || oBlock.mpoMaskOut != nullptr),
       mbStreamed(oBlock.moTypes.mpfnStore == nullptr &&
                  oBlock.moOut.mnBufferSize >= kStreamedBytes),
-      mbInPlace(oBlock.moTypes.mpfnStore == nullptr && !mbMasked && !mbStreamed),
+      mbInPlace(oBlock.moTypes.mpfnStore == nullptr && !mbMasked &&
+                (!mbStreamed || oBlock.mbCoreStreams)),
       mvdfResults(mbInPlace ? 0 : oBlock.mnGroupRows * mnLength),
       mvComputed(mbMasked ? oBlock.mnGroupRows * nTilePixels : 0)
 {
@@ -58,7 +59,7 @@ bool TileOutput::HasComputedPixels() const
 
 StencilPlace TileOutput::Place() const
 {
-    return {static_cast<std::int64_t>(mnX), mnY, mvComputed};
+    return {static_cast<std::int64_t>(mnX), mnY, mvComputed, mbInPlace && mbStreamed};
 }
 
 void TileOutput::Finish()

@@ -222,30 +222,66 @@ TEST_P(StencilKernels, DifferencesBelowTheBoundAreFlat)
     EXPECT_EQ(vdfResults[3], 1e-9);
 }
 
+/// Compares oRows.Results() with the gradients of the windows.
+void ExpectGradients(const Rows& oRows, const GradientScale& oScale)
+{
+    const double w = oScale.mdfCentreWeight;
+    oRows.ExpectResults(
+        [&](std::size_t i, std::size_t j)
+        {
+            const auto oAt = [&](std::size_t dx, std::size_t dy)
+            { return oRows.Valid(i, j, dx, dy) ? oRows.Sample(i, j, dx, dy) : oRows.Centre(i, j); };
+            const double dfX =
+                oAt(2, 0) - oAt(0, 0) - w * oAt(0, 1) + w * oAt(2, 1) - oAt(0, 2) + oAt(2, 2);
+            const double dfY =
+                w * oAt(1, 0) + oAt(0, 0) + oAt(2, 0) - oAt(0, 2) - w * oAt(1, 2) - oAt(2, 2);
+            return std::sqrt(dfY * dfY + dfX * dfX) * oScale.mdfFactor;
+        });
+}
+
+constexpr Window kThreeByThree[] = {{3, 3}};
+
 TEST_P(StencilKernels, GradientsAreAddedFromTheLeft)
 {
     for (const bool bMasked : {false, true})
     {
-        const double w = bMasked ? 1.0 : 2.0;
+        const GradientScale oScale = {bMasked ? 1.0 : 2.0, 0.7};
         const auto oTest = [&](const Rows& oRows)
         {
-            GradientRows(oRows.Get(), w, 0.7, oRows.Results());
-            oRows.ExpectResults(
-                [&](std::size_t i, std::size_t j)
-                {
-                    const auto oAt = [&](std::size_t dx, std::size_t dy) {
-                        return oRows.Valid(i, j, dx, dy) ? oRows.Sample(i, j, dx, dy)
-                                                         : oRows.Centre(i, j);
-                    };
-                    const double dfX = oAt(2, 0) - oAt(0, 0) - w * oAt(0, 1) + w * oAt(2, 1) -
-                                       oAt(0, 2) + oAt(2, 2);
-                    const double dfY = w * oAt(1, 0) + oAt(0, 0) + oAt(2, 0) - oAt(0, 2) -
-                                       w * oAt(1, 2) - oAt(2, 2);
-                    return std::sqrt(dfY * dfY + dfX * dfX) * 0.7;
-                });
+            GradientRows(oRows.Get(), oScale, oRows.Results(), false);
+            ExpectGradients(oRows, oScale);
         };
-        constexpr Window kThree[] = {{3, 3}};
-        ForEachCase(kThree, bMasked, oTest);
+        ForEachCase(kThreeByThree, bMasked, oTest);
+    }
+}
+
+// Rows that begin at equal places of a vector in memory and rows that don't, each at all places.
+TEST_P(StencilKernels, StreamedGradientsAreTheSame)
+{
+    constexpr GradientScale kScale = {2.0, 0.7};
+    std::size_t nPlace = 0;
+    for (const std::size_t nRowDoubles : {80U, 73U})
+    {
+        const auto oTest = [&](const Rows& oRows)
+        {
+            const std::size_t nRows = oRows.Results().size();
+            std::vector<double> vdfBlock(8 + nRows * nRowDoubles, -7.0);
+            std::vector<double*> vpRows;
+            for (std::size_t j = 0; j < nRows; ++j)
+            {
+                vpRows.push_back(&vdfBlock[nPlace % 8 + j * nRowDoubles]);
+            }
+            GradientRows(oRows.Get(), kScale, vpRows, true);
+            for (std::size_t j = 0; j < nRows; ++j)
+            {
+                const std::size_t nSamples = oRows.Get().mnSamples;
+                std::copy_n(vpRows[j], nSamples, oRows.Results()[j]);
+                EXPECT_EQ(vpRows[j][nSamples], -7.0) << "written behind the row";
+            }
+            ExpectGradients(oRows, kScale);
+            ++nPlace;
+        };
+        ForEachCase(kThreeByThree, false, oTest);
     }
 }
 
