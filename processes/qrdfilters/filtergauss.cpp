@@ -24,6 +24,9 @@ namespace
 
 constexpr const char* kSource = "processes/qrdfilters/filtergauss";
 
+// Long, since memory is read fastest in one go: the rows of a window stay in the second cache.
+constexpr std::size_t kShortestTile = 4096;
+
 bool IsDefined(double dfSigmasq)
 {
     return !(std::fabs(dfSigmasq) < std::numeric_limits<double>::epsilon());
@@ -71,44 +74,49 @@ public:
     void operator()(const kernels::StencilRows& oRows, const stencil::StencilPlace& oPlace,
                     std::span<double* const> oResults)
     {
-        const std::span<double> vdfOut(oResults[0], oRows.mnSamples);
         if (oRows.moValid.empty())
         {
-            SmoothAll(oRows, vdfOut);
+            kernels::SmoothRows(oRows, moKernels, mvdfColumns, oResults, oPlace.mbStreamed);
             return;
         }
         const std::size_t nPixels = oRows.mnSamples / oRows.mnStep;
-        mvDirect.resize(nPixels);
-        FindWholeWindows(*moBlock.mpoValid, moBlock.moWindow.mnHalfX, moBlock.moWindow.mnHalfY,
-                         oPlace.x, oPlace.y, mvDirect);
-        if (FindByte(mvDirect, 0, 1) != nPixels)
+        for (std::size_t j = 0; j < oResults.size(); ++j)
         {
-            SmoothAll(oRows, vdfOut);
+            kernels::StencilRows oRow = oRows;
+            oRow.moSamples = oRows.moSamples.subspan(j, oRows.mnHeight);
+            oRow.moValid = oRows.moValid.subspan(j, oRows.mnHeight);
+            SmoothRow(oRow, oPlace.x, oPlace.y + static_cast<std::int64_t>(j),
+                      oPlace.moComputed.subspan(j * nPixels, nPixels), oResults.subspan(j, 1));
         }
-        std::transform(mvDirect.begin(), mvDirect.end(), oPlace.moComputed.begin(),
-                       mvDirect.begin(),
-                       [](unsigned char nWhole, unsigned char nComputed)
-                       { return static_cast<unsigned char>(nComputed & ~nWhole); });
-        SmoothDirect(oRows, vdfOut);
     }
 
 private:
-    void SmoothAll(const kernels::StencilRows& oRows, std::span<double> vdfOut)
+    /// One output row, from pixel (x, y) on.
+    void SmoothRow(const kernels::StencilRows& oRow, std::int64_t x, std::int64_t y,
+                   std::span<const unsigned char> oComputed, std::span<double* const> oResult)
     {
-        const std::size_t nColumns = oRows.mnSamples + (oRows.mnWidth - 1) * oRows.mnStep;
-        mvdfColumns.resize(moKernels.moSecond.empty() ? nColumns : 2 * nColumns);
-        kernels::SmoothRow(oRows, moKernels, mvdfColumns, vdfOut);
+        mvDirect.resize(oComputed.size());
+        FindWholeWindows(*moBlock.mpoValid, moBlock.moWindow.mnHalfX, moBlock.moWindow.mnHalfY, x,
+                         y, mvDirect);
+        if (FindByte(mvDirect, 0, 1) != mvDirect.size())
+        {
+            kernels::SmoothRows(oRow, moKernels, mvdfColumns, oResult, false);
+        }
+        std::transform(mvDirect.begin(), mvDirect.end(), oComputed.begin(), mvDirect.begin(),
+                       [](unsigned char nWhole, unsigned char nComputed)
+                       { return static_cast<unsigned char>(nComputed & ~nWhole); });
+        SmoothDirect(oRow, {oResult[0], oRow.mnSamples});
     }
 
     /// The pixels where mvDirect is 1.
-    void SmoothDirect(const kernels::StencilRows& oRows, std::span<double> vdfOut) const
+    void SmoothDirect(const kernels::StencilRows& oRow, std::span<double> vdfOut) const
     {
-        const std::size_t nStep = oRows.mnStep;
+        const std::size_t nStep = oRow.mnStep;
         std::size_t nFirst = FindByte(mvDirect, 0, 1);
         while (nFirst != mvDirect.size())
         {
             const std::size_t nEnd = FindByte(mvDirect, nFirst, 0);
-            kernels::SmoothMasked(oRows, moKernels, nFirst * nStep,
+            kernels::SmoothMasked(oRow, moKernels, nFirst * nStep,
                                   vdfOut.subspan(nFirst * nStep, (nEnd - nFirst) * nStep));
             nFirst = FindByte(mvDirect, nEnd, 1);
         }
@@ -211,7 +219,8 @@ void FilterGauss::ProcessBlock(tessel::Raster* poRasterIn, tessel::Mask* poMaskI
     stencil::SampleTypes oTypes = stencil::SampleTypesOf<double, double>(true);
     oTypes.mpfnBackground = mbBGZero ? nullptr : WriteRowSamples;
     stencil::StencilBlock oBlock(*poRasterIn, poMaskIn, *poRasterOut, poMaskOut, oWindow, oTypes);
-    oBlock.mnGroupRows = 1;
+    oBlock.mnShortestTile = kShortestTile;
+    oBlock.mbCoreStreams = true;
     kernels::GaussKernels oKernels{{madfKernel1.data(), nHalf + 1}, {}};
     if (mbTwoKernels)
     {

@@ -1,6 +1,10 @@
 #include "processes/qrdfilters/kernels/gaussrows.h"
 
+#include <algorithm>
+#include <array>
+
 #include "processes/qrdfilters/kernels/targets.h"
+#include "processes/qrdfilters/kernels/windowsums.h"
 
 #undef HWY_TARGET_INCLUDE
 #define HWY_TARGET_INCLUDE "processes/qrdfilters/kernels/gaussrows.cpp"
@@ -11,6 +15,11 @@ HWY_BEFORE_NAMESPACE();
 
 namespace kor::filters::kernels::HWY_NAMESPACE
 {
+
+// Output rows that ForEachRowGroup gives at once, at most.
+constexpr std::size_t kRowsTogether = 4;
+// Samples of a row whose column sums stay in the first cache.
+constexpr std::size_t kSamplesTogether = 512;
 
 /// The weights of kKernels kernels.
 template <std::size_t kKernels>
@@ -49,6 +58,7 @@ HWY_INLINE GaussSums<D, kKernels, kVectors> AddMirrored(D oTag, const Weights<kK
     GaussSums<D, kKernels, kVectors> oSums;
     for (std::size_t n = 0; n < kKernels; ++n)
     {
+        HWY_UNROLL(8)
         for (std::size_t v = 0; v < kVectors; ++v)
         {
             oSums.aoSums[n][v] = hn::Zero(oTag);
@@ -59,6 +69,7 @@ HWY_INLINE GaussSums<D, kKernels, kVectors> AddMirrored(D oTag, const Weights<kK
         for (std::size_t n = 0; n < kKernels; ++n)
         {
             const auto oWeight = oWeights.Get(oTag, n, k);
+            HWY_UNROLL(8)
             for (std::size_t v = 0; v < kVectors; ++v)
             {
                 oSums.aoSums[n][v] = hn::Add(oSums.aoSums[n][v], hn::Mul(oPair(n, k, v), oWeight));
@@ -68,6 +79,7 @@ HWY_INLINE GaussSums<D, kKernels, kVectors> AddMirrored(D oTag, const Weights<kK
     for (std::size_t n = 0; n < kKernels; ++n)
     {
         const auto oWeight = oWeights.Get(oTag, n, oWeights.mnHalf);
+        HWY_UNROLL(8)
         for (std::size_t v = 0; v < kVectors; ++v)
         {
             oSums.aoSums[n][v] = hn::Add(oSums.aoSums[n][v], hn::Mul(oWeight, oMiddle(n, v)));
@@ -83,40 +95,71 @@ HWY_INLINE hn::Vec<D> Result(const GaussSums<D, kKernels, kVectors>& oSums, std:
                          : hn::Abs(hn::Sub(oSums.aoSums[0][v], oSums.aoSums[kKernels - 1][v]));
 }
 
-template <std::size_t kKernels>
-void SumColumns(const StencilRows& oRows, const Weights<kKernels>& oWeights,
-                std::span<double> adfColumns)
+/// Column sums of kRows output rows, kernel by kernel in each. The rows of their windows move
+/// through registers, so that each is loaded once from above and once from below. Loops over them
+/// are unrolled by order: else the compiler keeps them in memory.
+template <std::size_t kRows, std::size_t kKernels>
+void SumColumns(const StencilRows& oRows, const Weights<kKernels>& oWeights, double* pColumns)
 {
-    const std::size_t nColumns = adfColumns.size() / kKernels;
+    const std::size_t nColumns = oRows.mnSamples + (oRows.mnWidth - 1) * oRows.mnStep;
     const std::size_t nLast = 2 * oWeights.mnHalf;
     const double* const* apRows = oRows.moSamples.data();
-    const auto oVectors = [&](auto oTag, auto kVectors, std::size_t i) HWY_ATTR
+    const auto oVectors = [&](auto oTag, auto, std::size_t i) HWY_ATTR
     {
-        const std::size_t nLanes = hn::Lanes(oTag);
-        const auto oPair = [&](std::size_t, std::size_t k, std::size_t v) HWY_ATTR
+        using D = decltype(oTag);
+        hn::Vec<D> aoAbove[kRows];
+        hn::Vec<D> aoBelow[kRows];
+        GaussSums<D, kKernels, kRows> oSums;
+        HWY_UNROLL(8)
+        for (std::size_t j = 0; j < kRows; ++j)
         {
-            return hn::Add(hn::LoadU(oTag, apRows[k] + i + v * nLanes),
-                           hn::LoadU(oTag, apRows[nLast - k] + i + v * nLanes));
-        };
-        const auto oMiddle = [&](std::size_t, std::size_t v) HWY_ATTR
-        { return hn::LoadU(oTag, apRows[oWeights.mnHalf] + i + v * nLanes); };
-        const auto oSums = AddMirrored<kVectors()>(oTag, oWeights, oPair, oMiddle);
-        for (std::size_t n = 0; n < kKernels; ++n)
-        {
-            for (std::size_t v = 0; v < kVectors(); ++v)
+            aoAbove[j] = hn::LoadU(oTag, apRows[j] + i);
+            aoBelow[j] = hn::LoadU(oTag, apRows[nLast + j] + i);
+            for (std::size_t n = 0; n < kKernels; ++n)
             {
-                hn::StoreU(oSums.aoSums[n][v], oTag, &adfColumns[n * nColumns + i + v * nLanes]);
+                oSums.aoSums[n][j] = hn::Zero(oTag);
+            }
+        }
+        for (std::size_t k = 0; k < oWeights.mnHalf; ++k)
+        {
+            HWY_UNROLL(8)
+            for (std::size_t j = 0; j < kRows; ++j)
+            {
+                const auto oPair = hn::Add(aoAbove[j], aoBelow[j]);
+                for (std::size_t n = 0; n < kKernels; ++n)
+                {
+                    oSums.aoSums[n][j] =
+                        hn::Add(oSums.aoSums[n][j], hn::Mul(oPair, oWeights.Get(oTag, n, k)));
+                }
+            }
+            HWY_UNROLL(8)
+            for (std::size_t j = 1; j < kRows; ++j)
+            {
+                aoAbove[j - 1] = aoAbove[j];
+                aoBelow[kRows - j] = aoBelow[kRows - j - 1];
+            }
+            aoAbove[kRows - 1] = hn::LoadU(oTag, apRows[k + kRows] + i);
+            aoBelow[0] = hn::LoadU(oTag, apRows[nLast - k - 1] + i);
+        }
+        HWY_UNROLL(8)
+        for (std::size_t j = 0; j < kRows; ++j)
+        {
+            for (std::size_t n = 0; n < kKernels; ++n)
+            {
+                const auto oMiddle = hn::Mul(oWeights.Get(oTag, n, oWeights.mnHalf), aoAbove[j]);
+                hn::StoreU(hn::Add(oSums.aoSums[n][j], oMiddle), oTag,
+                           pColumns + (j * kKernels + n) * nColumns + i);
             }
         }
     };
-    ForEachVector(nColumns, oVectors);
+    ForEachVector<1>(nColumns, oVectors);
 }
 
 template <std::size_t kKernels>
-void SumAcross(const StencilRows& oRows, const Weights<kKernels>& oWeights,
-               std::span<const double> adfColumns, std::span<double> oOut)
+void SumAcross(const StencilRows& oRows, const Weights<kKernels>& oWeights, const double* pSums,
+               double* pOut)
 {
-    const std::size_t nColumns = adfColumns.size() / kKernels;
+    const std::size_t nColumns = oRows.mnSamples + (oRows.mnWidth - 1) * oRows.mnStep;
     const std::size_t nStep = oRows.mnStep;
     const std::size_t nLast = 2 * oWeights.mnHalf * nStep;
     const auto oVectors = [&](auto oTag, auto kVectors, std::size_t i) HWY_ATTR
@@ -124,22 +167,22 @@ void SumAcross(const StencilRows& oRows, const Weights<kKernels>& oWeights,
         const std::size_t nLanes = hn::Lanes(oTag);
         const auto oPair = [&](std::size_t n, std::size_t k, std::size_t v) HWY_ATTR
         {
-            const double* pColumns = &adfColumns[n * nColumns + i + v * nLanes];
+            const double* pColumns = pSums + n * nColumns + i + v * nLanes;
             return hn::Add(hn::LoadU(oTag, pColumns + k * nStep),
                            hn::LoadU(oTag, pColumns + nLast - k * nStep));
         };
         const auto oMiddle = [&](std::size_t n, std::size_t v) HWY_ATTR
         {
-            const double* pColumns = &adfColumns[n * nColumns + i + v * nLanes];
+            const double* pColumns = pSums + n * nColumns + i + v * nLanes;
             return hn::LoadU(oTag, pColumns + oWeights.mnHalf * nStep);
         };
         const auto oSums = AddMirrored<kVectors()>(oTag, oWeights, oPair, oMiddle);
         for (std::size_t v = 0; v < kVectors(); ++v)
         {
-            hn::StoreU(Result(oSums, v), oTag, &oOut[i + v * nLanes]);
+            hn::StoreU(Result(oSums, v), oTag, pOut + i + v * nLanes);
         }
     };
-    ForEachVector(oOut.size(), oVectors);
+    ForEachVector(oRows.mnSamples, oVectors);
 }
 
 /// The samples of one vector of windows, masked ones replaced by the centres.
@@ -199,20 +242,78 @@ void SmoothMaskedBy(const StencilRows& oRows, const Weights<kKernels>& oWeights,
     ForEachVector(oOut.size(), oVectors);
 }
 
-void SmoothRow(const StencilRows& oRows, const GaussKernels& oKernels, std::span<double> adfColumns,
-               std::span<double> oOut)
+/// oRows from sample nFirst on, nSamples of it.
+class StencilPart
 {
-    if (oKernels.moSecond.empty())
+public:
+    StencilPart(const StencilRows& oRows, std::size_t nFirst, std::size_t nSamples) : moRows(oRows)
     {
-        const Weights<1> oWeights(oKernels);
-        SumColumns(oRows, oWeights, adfColumns);
-        SumAcross(oRows, oWeights, adfColumns, oOut);
+        std::transform(oRows.moSamples.begin(), oRows.moSamples.end(), mapRows.begin(),
+                       [nFirst](const double* pRow) { return pRow + nFirst; });
+        moRows.moSamples = std::span(mapRows).first(oRows.moSamples.size());
+        moRows.mnSamples = nSamples;
+    }
+    StencilPart(const StencilPart&) = delete;
+    StencilPart& operator=(const StencilPart&) = delete;
+
+    const StencilRows& Get() const { return moRows; }
+
+private:
+    std::array<const double*, kLongestGaussKernel + kRowsTogether - 1> mapRows;
+    StencilRows moRows;
+};
+
+template <std::size_t kRows, std::size_t kKernels>
+void SmoothPart(const StencilRows& oRows, const Weights<kKernels>& oWeights, double* pColumns,
+                double* const* apOut, std::size_t nFirst, bool bStreamed)
+{
+    const std::size_t nColumns = oRows.mnSamples + (oRows.mnWidth - 1) * oRows.mnStep;
+    SumColumns<kRows>(oRows, oWeights, pColumns);
+    for (std::size_t j = 0; j < kRows; ++j)
+    {
+        const double* pSums = pColumns + j * kKernels * nColumns;
+        if (bStreamed)
+        {
+            std::array<double, kSamplesTogether> adfResults;
+            SumAcross(oRows, oWeights, pSums, adfResults.data());
+            StreamRow({adfResults.data(), oRows.mnSamples}, apOut[j] + nFirst);
+        }
+        else
+        {
+            SumAcross(oRows, oWeights, pSums, apOut[j] + nFirst);
+        }
+    }
+}
+
+/// A part after the other, so that column sums stay in the first cache.
+template <std::size_t kKernels>
+void SmoothRowsBy(const StencilRows& oRows, const Weights<kKernels>& oWeights, double* pColumns,
+                  std::span<double* const> oOut, bool bStreamed)
+{
+    const auto oOfRows = [&](auto kRows, const StencilRows& oTogether, double* const* apOut)
+    {
+        for (std::size_t i = 0; i < oRows.mnSamples; i += kSamplesTogether)
+        {
+            const StencilPart oPart(oTogether, i, std::min(kSamplesTogether, oRows.mnSamples - i));
+            SmoothPart<kRows()>(oPart.Get(), oWeights, pColumns, apOut, i, bStreamed);
+        }
+    };
+    ForEachRowGroup(oRows, oOut, oOfRows);
+}
+
+void SmoothRows(const StencilRows& oRows, const GaussKernels& oKernels,
+                std::vector<double>& vdfColumns, std::span<double* const> oOut, bool bStreamed)
+{
+    const std::size_t nColumns = kSamplesTogether + (oRows.mnWidth - 1) * oRows.mnStep;
+    const bool bOneKernel = oKernels.moSecond.empty();
+    vdfColumns.resize(std::max(vdfColumns.size(), kRowsTogether * (bOneKernel ? 1 : 2) * nColumns));
+    if (bOneKernel)
+    {
+        SmoothRowsBy(oRows, Weights<1>(oKernels), vdfColumns.data(), oOut, bStreamed);
     }
     else
     {
-        const Weights<2> oWeights(oKernels);
-        SumColumns(oRows, oWeights, adfColumns);
-        SumAcross(oRows, oWeights, adfColumns, oOut);
+        SmoothRowsBy(oRows, Weights<2>(oKernels), vdfColumns.data(), oOut, bStreamed);
     }
 }
 
@@ -238,13 +339,13 @@ HWY_AFTER_NAMESPACE();
 namespace kor::filters::kernels
 {
 
-HWY_EXPORT(SmoothRow);
+HWY_EXPORT(SmoothRows);
 HWY_EXPORT(SmoothMasked);
 
-void SmoothRow(const StencilRows& oRows, const GaussKernels& oKernels, std::span<double> adfColumns,
-               std::span<double> oOut)
+void SmoothRows(const StencilRows& oRows, const GaussKernels& oKernels,
+                std::vector<double>& vdfColumns, std::span<double* const> oOut, bool bStreamed)
 {
-    HWY_DYNAMIC_DISPATCH(SmoothRow)(oRows, oKernels, adfColumns, oOut);
+    HWY_DYNAMIC_DISPATCH(SmoothRows)(oRows, oKernels, vdfColumns, oOut, bStreamed);
 }
 
 void SmoothMasked(const StencilRows& oRows, const GaussKernels& oKernels, std::size_t nFirst,
