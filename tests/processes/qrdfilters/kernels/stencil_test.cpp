@@ -4,6 +4,7 @@
 #include <hwy/tests/hwy_gtest.h>
 
 #include <cmath>
+#include <numeric>
 #include <vector>
 
 #include "processes/qrdfilters/kernels/correlaterows.h"
@@ -319,7 +320,11 @@ TEST_P(StencilKernels, SmoothingAddsMirroredSamplesFirst)
         const bool bTwo = (nCase & 2U) != 0;
         for (const Window oWindow : kSquares)
         {
-            for (std::size_t nSamples = 1; nSamples <= 24; ++nSamples)
+            // Up to three vectors, and rows whose column sums are formed in several parts.
+            std::vector<std::size_t> vnLengths(24);
+            std::iota(vnLengths.begin(), vnLengths.end(), 1);
+            vnLengths.insert(vnLengths.end(), {512, 513, 1100});
+            for (const std::size_t nSamples : vnLengths)
             {
                 const std::size_t nRows = bMasked ? 1 : 1 + moRandom() % 6;
                 const Rows oRows(nRows, nSamples, 1 + moRandom() % 4, oWindow, bMasked, moRandom);
